@@ -1,0 +1,50 @@
+#pragma once
+
+#include <QDateTime>
+#include <QString>
+
+namespace core::text {
+
+/// Basic comparison modes.
+enum class Compare { Binary, Text };
+
+/// Text comparison (Option Compare Text): case-insensitive equality.
+bool equalsText(const QString& a, const QString& b);
+
+/// InStr: 1-based position of `find` in `text` from `start` (1-based), 0 when absent.
+int inStr(int start, const QString& text, const QString& find, Compare compare = Compare::Binary);
+int inStr(const QString& text, const QString& find, Compare compare = Compare::Binary);
+/// InStrRev: searches backwards from `start` (-1 = end); 1-based, 0 when absent.
+int inStrRev(const QString& text, const QString& find, int start = -1,
+    Compare compare = Compare::Binary);
+
+/// Trim / LTrim / RTrim: spaces (U+0020) only, not tabs or line breaks.
+QString trimSpaces(const QString& text);
+QString trimLeftSpaces(const QString& text);
+QString trimRightSpaces(const QString& text);
+
+/// Basic Left$, Right$, Mid$ (1-based start, length -1 = to the end); never raise.
+QString left(const QString& text, int length);
+QString right(const QString& text, int length);
+QString mid(const QString& text, int start, int length = -1);
+
+/// Replace$ of every occurrence.
+QString replace(const QString& text, const QString& find, const QString& with,
+    Compare compare = Compare::Binary);
+
+/// The Like operator: ? one character, * any run, # one digit, [list] and [!list] with
+/// ranges. Binary compare is case-sensitive; Text is not.
+bool like(const QString& text, const QString& pattern, Compare compare = Compare::Binary);
+
+/// Format$ for dates with the pattern letters d, dd, m, mm (month; minutes after h),
+/// yy, yyyy, h, hh, n, nn, s, ss, in any letter case, and "/" (the locale date separator)
+/// ":" "." "-" " " as literals. Example: format(dt, "DDYYMMHHNNSS") -> "042612224831".
+QString format(const QDateTime& value, const QString& pattern);
+
+/// The date separator of the user's short-date format (what Format$(date, "/") gives).
+QString dateSeparator();
+
+/// The user's short-date pattern in Basic letters with a four-digit year, e.g. "dd.mm.yyyy".
+QString shortDatePattern();
+
+} // namespace core::text
