@@ -1,0 +1,351 @@
+#include "selectiontext.h"
+
+#include "core/collection.h"
+#include "core/dictionary.h"
+#include "core/text.h"
+
+#include <QRegularExpression>
+#include <vector>
+
+namespace reports::SelectionText {
+
+namespace {
+
+const QString crlf = QStringLiteral("\r\n");
+
+bool sameText(const QString& a, const QString& b)
+{
+    return a.compare(b, Qt::CaseInsensitive) == 0;
+}
+
+QString trimmed(const QString& text)
+{
+    return core::text::trimSpaces(text);
+}
+
+bool isPlainNumber(const QString& text)
+{
+    static const QRegularExpression number(QStringLiteral("^[-+]?\\d+(\\.\\d+)?$"));
+    return number.match(trimmed(text)).hasMatch();
+}
+
+// A value placed in an SQL IN list. Numbers keep their invariant form; any other text is
+// written as a string literal so that it can neither break nor extend the statement.
+QString inListElement(const core::Variant& element)
+{
+    switch (element.type()) {
+    case core::VariantType::Null:
+        return QStringLiteral("NULL");
+    case core::VariantType::Byte:
+    case core::VariantType::Integer:
+    case core::VariantType::Long:
+    case core::VariantType::Single:
+    case core::VariantType::Double:
+    case core::VariantType::Currency:
+        return element.toInvariantText();
+    case core::VariantType::Boolean:
+        return element.toBoolean() ? QStringLiteral("-1") : QStringLiteral("0");
+    default:
+        break;
+    }
+    const QString text = element.type() == core::VariantType::String ? element.toText()
+                                                                     : element.toInvariantText();
+    if (isPlainNumber(text))
+        return trimmed(text);
+    QString quoted = text;
+    quoted.replace(QLatin1Char('\''), QStringLiteral("''"));
+    return QLatin1Char('\'') + quoted + QLatin1Char('\'');
+}
+
+std::vector<core::Variant> elementsOf(const core::Variant& selection)
+{
+    if (selection.isArray())
+        return selection.array().values();
+    const core::ObjectPtr object = selection.toObject();
+    if (const auto collection = std::dynamic_pointer_cast<core::Collection>(object))
+        return collection->items();
+    if (const auto dictionary = std::dynamic_pointer_cast<core::Dictionary>(object))
+        return dictionary->keys();
+    return {};
+}
+
+bool isNumberKind(core::VariantType type)
+{
+    switch (type) {
+    case core::VariantType::Byte:
+    case core::VariantType::Integer:
+    case core::VariantType::Long:
+    case core::VariantType::Single:
+    case core::VariantType::Double:
+    case core::VariantType::Currency:
+    case core::VariantType::Boolean:
+        return true;
+    default:
+        return false;
+    }
+}
+
+QString dropTrailingLineBreaks(QString text)
+{
+    while (text.endsWith(crlf))
+        text.chop(2);
+    return text;
+}
+
+QString joinLines(const QStringList& lines, qsizetype from, qsizetype to)
+{
+    QString joined;
+    for (qsizetype i = from; i < to; ++i)
+        joined += lines.at(i) + crlf;
+    return joined;
+}
+
+bool isSpace(QChar c)
+{
+    return c == QLatin1Char(' ') || c == QLatin1Char('\t') || c == QLatin1Char('\r')
+        || c == QLatin1Char('\n');
+}
+
+// 0-based index of the last occurrence of keyword, or -1.
+qsizetype lastKeyword(const QString& sql, const QString& keyword)
+{
+    return sql.lastIndexOf(keyword, -1, Qt::CaseInsensitive);
+}
+
+} // namespace
+
+Request BuildRequest(const QString& tableName, const core::Variant& selection)
+{
+    Request request;
+    if (selection.isNull())
+        return request;
+    if (selection.isEmpty()) {
+        request.noSelection = true;
+        return request;
+    }
+    if (selection.isArray() || selection.isObject()) {
+        QStringList elements;
+        for (const core::Variant& element : elementsOf(selection))
+            elements << inListElement(element);
+        request.listClause
+            = tableName + QStringLiteral(".ID IN (") + elements.join(QLatin1Char(',')) + u')';
+    } else if (isNumberKind(selection.type())) {
+        request.formulaSelection = true;
+        request.formulaClause
+            = u'{' + tableName + QStringLiteral(".ID}=") + inListElement(selection);
+    } else if (selection.type() == core::VariantType::String) {
+        const QString text = selection.toText();
+        if (text.startsWith(u'{')) {
+            request.formulaSelection = true;
+            request.formulaClause = text;
+        } else {
+            request.listClause = text;
+        }
+    }
+    return request;
+}
+
+QString ComposeSelectionFormula(int mode, const QString& originalSel, const QString& formulaClause)
+{
+    switch (mode) {
+    case 0:
+        return QString(ComponentOnly) + crlf + formulaClause + u')' + crlf + QString(UserAddition);
+    case 1:
+        return originalSel;
+    default:
+        if (IsCommentOnly(originalSel))
+            return originalSel + crlf + QString(ComponentClause) + crlf + formulaClause;
+        return QString(AuthorOpen) + crlf + originalSel + crlf + QString(AuthorClose) + crlf
+            + QString(ComponentClause) + crlf + QStringLiteral("AND (") + formulaClause + u')';
+    }
+}
+
+bool IsCommentOnly(const QString& text)
+{
+    if (!text.contains(crlf))
+        return trimmed(text).startsWith(QStringLiteral("//"));
+    const QStringList lines = text.split(crlf);
+    for (const QString& line : lines) {
+        if (!trimmed(line).startsWith(QStringLiteral("//")))
+            return false;
+    }
+    return true;
+}
+
+bool HasSelectionMarkers(const QString& formula)
+{
+    const QStringList lines = formula.split(crlf);
+    const QString& first = lines.first();
+    if (sameText(first, QString(ComponentOnly)))
+        return true;
+    if (sameText(first, QString(AuthorOpen))) {
+        for (qsizetype i = 1; i + 1 < lines.size(); ++i) {
+            if (sameText(lines.at(i), QString(AuthorClose))
+                && sameText(lines.at(i + 1), QString(ComponentClause)))
+                return true;
+        }
+        return false;
+    }
+    return first.startsWith(QStringLiteral("//"))
+        && formula.contains(QString(ComponentClause), Qt::CaseInsensitive)
+        && !formula.contains(QString(AuthorClose), Qt::CaseInsensitive);
+}
+
+QString ExtractUserSelection(const QString& formula)
+{
+    const QStringList lines = formula.split(crlf);
+    const QString& first = lines.first();
+
+    if (sameText(first, QString(ComponentOnly))) {
+        for (qsizetype i = 1; i + 1 < lines.size(); ++i) {
+            if (!sameText(lines.at(i), QString(UserAddition)))
+                continue;
+            QString part = joinLines(lines, i + 1, lines.size());
+            if (part.size() < 3)
+                return {};
+            part = dropTrailingLineBreaks(part);
+            if (part.startsWith(QStringLiteral("AND "), Qt::CaseInsensitive))
+                return part.mid(4);
+            return {};
+        }
+        return {};
+    }
+
+    if (sameText(first, QString(AuthorOpen))) {
+        qsizetype end = lines.size();
+        for (qsizetype i = 1; i + 1 < lines.size(); ++i) {
+            if (sameText(lines.at(i), QString(AuthorClose))
+                && sameText(lines.at(i + 1), QString(ComponentClause))) {
+                end = i;
+                break;
+            }
+        }
+        const QString part = joinLines(lines, 1, end);
+        return part.size() < 3 ? QString() : dropTrailingLineBreaks(part);
+    }
+
+    // The author's text stands before the line break that precedes the marker. A marker at
+    // the very start leaves no author's text.
+    const qsizetype marker = formula.indexOf(QString(ComponentClause), 0, Qt::CaseInsensitive);
+    if (marker < 2)
+        return {};
+    return formula.left(marker - 2);
+}
+
+QString CleanCapturedFormula(const QString& formula)
+{
+    QString text = trimmed(formula);
+    while (text.size() >= 2 && text.startsWith(crlf))
+        text = trimmed(text.mid(2));
+    while (text.size() >= 2 && text.endsWith(crlf))
+        text = trimmed(text.left(text.size() - 2));
+    return text;
+}
+
+QString BuildSqlConditions(const QString& specialSelection, const QString& selTableName,
+    const QStringList& reportTableNames)
+{
+    if (specialSelection.isEmpty())
+        return {};
+    QString conditions;
+    for (const QString& rawElement : specialSelection.split(u';')) {
+        QString element = trimmed(rawElement);
+        if (element.startsWith(QStringLiteral("EXISTS"), Qt::CaseInsensitive)
+            || element.startsWith(u'(')) {
+            conditions += QStringLiteral(" AND (") + element + u')';
+            continue;
+        }
+        QString table;
+        if (!element.contains(u'.')) {
+            table = selTableName;
+            element = selTableName + u'.' + element;
+        } else {
+            table = trimmed(element.left(element.indexOf(u'.')));
+        }
+        for (const QString& name : reportTableNames) {
+            if (sameText(name, table)) {
+                conditions += QStringLiteral(" AND (") + element + u')';
+                break;
+            }
+        }
+    }
+    if (conditions.isEmpty())
+        return {};
+    return u'(' + conditions.mid(5) + u')';
+}
+
+QString SpliceFilter(const QString& sql, const QString& filter, const QString& specialSelection,
+    const QString& formulaClause)
+{
+    const qsizetype from = lastKeyword(sql, QStringLiteral("FROM"));
+    // A keyword before the last FROM belongs to a sub-query.
+    const auto afterFrom = [&](qsizetype position) { return position > from ? position : -1; };
+    const qsizetype where = afterFrom(lastKeyword(sql, QStringLiteral("WHERE")));
+    const qsizetype orderBy = afterFrom(lastKeyword(sql, QStringLiteral("ORDER BY")));
+    const qsizetype groupBy = afterFrom(lastKeyword(sql, QStringLiteral("GROUP BY")));
+
+    qsizetype tailKeyword = -1;
+    if (orderBy >= 0 && groupBy >= 0)
+        tailKeyword = std::min(orderBy, groupBy);
+    else
+        tailKeyword = std::max(orderBy, groupBy);
+
+    // The white space before the tail's keyword (a line break in the runtime's layout) goes
+    // with the tail. A statement written on one line still keeps its keyword separated.
+    QString head = sql;
+    QString tail;
+    if (tailKeyword >= 0) {
+        qsizetype gap = tailKeyword;
+        while (gap > 0 && isSpace(sql.at(gap - 1)))
+            --gap;
+        head = sql.left(gap);
+        tail = sql.mid(gap);
+        if (gap == tailKeyword)
+            tail.prepend(crlf);
+    }
+
+    QString wherePart;
+    if (where < 0 || where >= head.size()) {
+        wherePart = crlf + QStringLiteral("WHERE") + crlf + QStringLiteral("    ") + filter;
+    } else {
+        qsizetype conditionStart = where + 5;
+        while (conditionStart < head.size() && isSpace(head.at(conditionStart)))
+            ++conditionStart;
+        const QString condition = trimmed(head.mid(conditionStart));
+        qsizetype headEnd = where;
+        while (headEnd > 0 && isSpace(head.at(headEnd - 1)))
+            --headEnd;
+        head = head.left(headEnd);
+        if (condition.contains(QStringLiteral(" OR"), Qt::CaseInsensitive))
+            wherePart = crlf + QStringLiteral("WHERE") + crlf + QStringLiteral("    (") + condition
+                + QStringLiteral(") AND (") + filter + u')';
+        else
+            wherePart = crlf + QStringLiteral("WHERE") + crlf + QStringLiteral("    ") + condition
+                + QStringLiteral(" AND (") + filter + u')';
+    }
+    if (!specialSelection.isEmpty() && !formulaClause.isEmpty()) {
+        QString clause = formulaClause;
+        clause.remove(u'{').remove(u'}');
+        wherePart += QStringLiteral("AND (") + clause + u')';
+    }
+    return head + wherePart + tail;
+}
+
+QString QuoteForServer(const QString& sql, int32_t serverType)
+{
+    QString result = sql;
+    switch (serverType) {
+    case 2:
+        result.replace(u'`', u'"');
+        break;
+    case 1:
+    case 3:
+        result.replace(u'"', u'`');
+        break;
+    default:
+        break;
+    }
+    return result;
+}
+
+} // namespace reports::SelectionText
