@@ -1,0 +1,19 @@
+#include "platformglobal_p.h"
+
+using namespace Qt::StringLiterals;
+
+Q_LOGGING_CATEGORY(lcPlatform, "ludmox.platform")
+
+namespace platform::detail {
+
+QString errorSource()
+{
+    return u"LUDMoxViewer115"_s;
+}
+
+void raise(int32_t number, const QString& description)
+{
+    throw core::ComError(number, errorSource(), description);
+}
+
+} // namespace platform::detail

@@ -1,0 +1,36 @@
+#pragma once
+
+#include "printerinfo.h"
+#include "printsettings.h"
+
+#include <QList>
+#include <QString>
+#include <optional>
+
+namespace platform {
+
+/// The installed printers: the system's print queues (CUPS) followed by the component's own
+/// PDF printer, which is always there. The PDF printer writes one PDF file per print job into
+/// its folder; its port is that folder.
+class Printers {
+public:
+    /// "LUD Mox PDF"
+    static QString virtualPdfDeviceName();
+    /// "ludmox-pdf"
+    static QString virtualPdfDriverName();
+    /// The PDF printer's folder: $LUDMOX_PDF_PRINTER_DIR when set, otherwise "LUD Mox PDF" in
+    /// the application's data folder. It is created when the first job is printed.
+    static QString virtualPdfFolder();
+    static PrinterInfo virtualPdfPrinter();
+
+    /// Every installed printer, the system's first, the PDF printer last.
+    static QList<PrinterInfo> installed();
+    /// The first installed printer whose device name is exactly deviceName.
+    static std::optional<PrinterInfo> find(const QString& deviceName);
+    /// The system's default printer, or the PDF printer when the system names none.
+    static PrinterInfo defaultPrinter();
+    /// The settings a printer starts with when it becomes the current printer.
+    static PrintSettings defaultSettings(const PrinterInfo& printer);
+};
+
+} // namespace platform

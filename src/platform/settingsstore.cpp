@@ -1,0 +1,174 @@
+#include "settingsstore.h"
+
+#include "platformglobal_p.h"
+
+#include <QDir>
+#include <QFileInfo>
+#include <QSettings>
+#include <QStandardPaths>
+
+using namespace Qt::StringLiterals;
+
+namespace platform {
+
+namespace {
+
+// QSettings reads "/" and "\" in a name as group separators; names here are flat, so
+// those characters (and "%", to keep the mapping reversible) are percent-encoded.
+QString encodeName(const QString& name)
+{
+    QString encoded;
+    encoded.reserve(name.size());
+    for (const QChar ch : name) {
+        if (ch == u'%')
+            encoded += u"%25"_s;
+        else if (ch == u'/')
+            encoded += u"%2F"_s;
+        else if (ch == u'\\')
+            encoded += u"%5C"_s;
+        else
+            encoded += ch;
+    }
+    return encoded;
+}
+
+QString fileNameFor(const QString& application)
+{
+    QString name = encodeName(application);
+    // A leading dot would hide the file or, as "..", leave the folder.
+    if (name.startsWith(u'.'))
+        name = u"%2E"_s + name.mid(1);
+    return name + u".ini"_s;
+}
+
+// The stored name that matches wanted without regard to case, preferring an exact match.
+QString storedName(const QStringList& names, const QString& wanted)
+{
+    if (names.contains(wanted))
+        return wanted;
+    for (const QString& name : names) {
+        if (name.compare(wanted, Qt::CaseInsensitive) == 0)
+            return name;
+    }
+    return wanted;
+}
+
+void requireName(const QString& name, const QString& what)
+{
+    if (name.isEmpty()) {
+        detail::raise(detail::PlatformError::InvalidProcedureCall,
+            u"Invalid procedure call or argument: the %1 name is empty"_s.arg(what));
+    }
+}
+
+void syncOrRaise(QSettings& settings)
+{
+    settings.sync();
+    if (settings.status() != QSettings::NoError) {
+        detail::raise(detail::PlatformError::PathFileAccess,
+            u"Path/File access error: the settings file %1 cannot be written"_s.arg(
+                settings.fileName()));
+    }
+}
+
+QString valueText(const QVariant& value)
+{
+    // A hand-edited line "key=a, b" reads as a list; give it back as it was written.
+    if (value.metaType().id() == QMetaType::QStringList)
+        return value.toStringList().join(u", "_s);
+    return value.toString();
+}
+
+} // namespace
+
+SettingsStore::SettingsStore()
+    : SettingsStore(QStandardPaths::writableLocation(QStandardPaths::GenericConfigLocation))
+{ }
+
+SettingsStore::SettingsStore(const QString& baseFolder)
+    : m_baseFolder(QDir::cleanPath(baseFolder) + u"/LUD Mox"_s)
+{ }
+
+QString SettingsStore::filePath(const QString& application) const
+{
+    return m_baseFolder + u'/' + fileNameFor(application);
+}
+
+std::optional<QString> SettingsStore::getSetting(
+    const QString& application, const QString& section, const QString& key) const
+{
+    if (application.isEmpty() || section.isEmpty() || key.isEmpty())
+        return std::nullopt;
+    const QString path = filePath(application);
+    if (!QFileInfo::exists(path))
+        return std::nullopt;
+
+    QSettings settings(path, QSettings::IniFormat);
+    settings.beginGroup(storedName(settings.childGroups(), encodeName(section)));
+    const QString storedKey = storedName(settings.childKeys(), encodeName(key));
+    if (!settings.contains(storedKey))
+        return std::nullopt;
+    return valueText(settings.value(storedKey));
+}
+
+QString SettingsStore::getSetting(const QString& application, const QString& section,
+    const QString& key, const QString& defaultValue) const
+{
+    return getSetting(application, section, key).value_or(defaultValue);
+}
+
+void SettingsStore::saveSetting(
+    const QString& application, const QString& section, const QString& key, const QString& value)
+{
+    requireName(application, u"application"_s);
+    requireName(section, u"section"_s);
+    requireName(key, u"key"_s);
+    if (!QDir().mkpath(m_baseFolder)) {
+        detail::raise(detail::PlatformError::PathFileAccess,
+            u"Path/File access error: the settings folder %1 cannot be created"_s.arg(
+                m_baseFolder));
+    }
+
+    QSettings settings(filePath(application), QSettings::IniFormat);
+    settings.beginGroup(storedName(settings.childGroups(), encodeName(section)));
+    settings.setValue(storedName(settings.childKeys(), encodeName(key)), value);
+    settings.endGroup();
+    syncOrRaise(settings);
+}
+
+bool SettingsStore::deleteSetting(const QString& application, const QString& section)
+{
+    const QString path = filePath(application);
+    if (application.isEmpty() || section.isEmpty() || !QFileInfo::exists(path))
+        return false;
+
+    QSettings settings(path, QSettings::IniFormat);
+    const QStringList sections = settings.childGroups();
+    const QString stored = storedName(sections, encodeName(section));
+    if (!sections.contains(stored))
+        return false;
+    settings.remove(stored);
+    syncOrRaise(settings);
+    return true;
+}
+
+bool SettingsStore::deleteSetting(
+    const QString& application, const QString& section, const QString& key)
+{
+    const QString path = filePath(application);
+    if (application.isEmpty() || section.isEmpty() || key.isEmpty() || !QFileInfo::exists(path))
+        return false;
+
+    QSettings settings(path, QSettings::IniFormat);
+    settings.beginGroup(storedName(settings.childGroups(), encodeName(section)));
+    const QStringList keys = settings.childKeys();
+    const QString stored = storedName(keys, encodeName(key));
+    if (!keys.contains(stored))
+        return false;
+    settings.remove(stored);
+    settings.endGroup();
+    syncOrRaise(settings);
+    return true;
+}
+
+} // namespace platform

@@ -1,0 +1,33 @@
+#pragma once
+
+#include <QString>
+
+namespace platform {
+
+/// The component's private per-user temporary folder: a directory of the user's own with
+/// mode 0700 under a base directory (the system temporary directory by default), created on
+/// demand. Report exports, mail attachments and trace files go here, so no other user may
+/// read them or plant files or links in it.
+///
+/// The folder is "ludmox-<uid>". When that name is taken by something the user cannot trust
+/// (a symbolic link, a file, a directory of another user) it is left alone and a fresh
+/// private folder with a random suffix is used instead; a folder of the user's own with a
+/// wider mode is narrowed to 0700.
+class TempFolder {
+public:
+    /// baseDirectory empty: the system temporary directory (QDir::tempPath()).
+    explicit TempFolder(const QString& baseDirectory = QString());
+
+    /// The absolute path of the folder, ending with "/", after making sure it exists and is
+    /// private. Raises ComError 75 (Path/File access error) when no private folder can be made.
+    QString path() const;
+
+    /// path() of the process-wide folder under the system temporary directory.
+    static QString systemPath();
+
+private:
+    QString m_baseDirectory;
+    mutable QString m_folder; // without the trailing "/"; empty until first used
+};
+
+} // namespace platform
