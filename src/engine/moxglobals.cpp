@@ -1,0 +1,55 @@
+#include "moxglobals.h"
+
+#include "core/text.h"
+#include "runtime/application.h"
+#include "runtime/applicationfactory.h"
+
+#include <QDateTime>
+#include <QFile>
+
+namespace engine {
+
+int16_t gLanguage = 0;
+bool gXPStyle = false;
+int32_t gBackColor = 0;
+MoxServerTypes gServerType = ecstNone;
+std::shared_ptr<runtime::Application> gApplication;
+int32_t gEngineCount = 0;
+QString gInstanceLogFile;
+
+QString DefaultTraceFile()
+{
+    return QStringLiteral("/ludmox.log");
+}
+
+std::shared_ptr<runtime::Application> GetApplication()
+{
+    if (!gApplication)
+        gApplication = runtime::ApplicationFactory::create();
+    return gApplication;
+}
+
+void ReleaseApplication()
+{
+    gApplication.reset();
+}
+
+void TraceWrite(const QString& message, const QString& file, bool enabled)
+{
+    if (!enabled)
+        return;
+    try {
+        // The general date format: the user's short date with a four-digit year, then the
+        // time with seconds.
+        const QString stamp = core::text::format(
+            QDateTime::currentDateTime(), core::text::shortDatePattern() + u" hh:nn:ss");
+        QFile out(file.isEmpty() ? DefaultTraceFile() : file);
+        if (!out.open(QIODevice::WriteOnly | QIODevice::Append))
+            return;
+        out.write((stamp + u' ' + message + u"\r\n").toUtf8());
+    } catch (...) {
+        // Tracing never disturbs the caller.
+    }
+}
+
+} // namespace engine
