@@ -214,8 +214,9 @@ TEST_F(ReportEvents, QueryParametersReturnsWhatTheLastHandlerLeft)
             EXPECT_EQ(event.dispid, 1);
             EXPECT_EQ(event.name, u"QueryParameters"_s);
         }
-        if (m_seen.size() == 2)
+        if (m_seen.size() == 2) {
             EXPECT_EQ(m_seen[1].arguments[0], core::Variant(u"first"_s));
+        }
     }
 }
 
