@@ -1,7 +1,6 @@
 #pragma once
 
 #include <QString>
-
 #include <cstdint>
 #include <exception>
 #include <string>
@@ -11,36 +10,41 @@ namespace core {
 /// Error numbers the component raises or gives special treatment. Values are the signed
 /// 32-bit form a host sees.
 namespace ErrorNumber {
-    constexpr int32_t ObjectErrorBase = static_cast<int32_t>(0x80040000);
-    /// "User Cancelled" and "Not an OLE DB report - please convert with Crystal Reports."
-    constexpr int32_t UserCancelled = static_cast<int32_t>(0x80040099);
-    constexpr int32_t NotOleDbReport = UserCancelled;
-    /// An exception turned into an error by the crash guard.
-    constexpr int32_t GuardedCrash = static_cast<int32_t>(0x8004029A);
-    /// Table-location failure raised by the engine.
-    constexpr int32_t SetLocationFailed = 666;
-    /// Runtime: the server logon failed to connect.
-    constexpr int32_t LogOnFailed = static_cast<int32_t>(0x80047E5D);
-    /// Runtime: a table's location could not be set (connection failed).
-    constexpr int32_t TableConnectionFailed = static_cast<int32_t>(0x80047E44);
-    /// Runtime: a server error while reading records; rewritten to 0x80047E53 when the
-    /// description does not carry the provider code 0x80004005.
-    constexpr int32_t ServerError = static_cast<int32_t>(0x80047E52);
-    constexpr int32_t ServerErrorRewritten = static_cast<int32_t>(0x80047E53);
-    /// Runtime: a report file could not be opened.
-    constexpr int32_t OpenReportFailed = static_cast<int32_t>(0x80047689);
-    /// Runtime: generic failure of a report operation.
-    constexpr int32_t RuntimeFailure = static_cast<int32_t>(0x80040309);
+constexpr int32_t ObjectErrorBase = static_cast<int32_t>(0x80040000);
+/// "User Cancelled" and "Not an OLE DB report - please convert with Crystal Reports."
+constexpr int32_t UserCancelled = static_cast<int32_t>(0x80040099);
+constexpr int32_t NotOleDbReport = UserCancelled;
+/// An exception turned into an error by the crash guard.
+constexpr int32_t GuardedCrash = static_cast<int32_t>(0x8004029A);
+/// Table-location failure raised by the engine.
+constexpr int32_t SetLocationFailed = 666;
+/// Runtime: the server logon failed to connect.
+constexpr int32_t LogOnFailed = static_cast<int32_t>(0x80047E5D);
+/// Runtime: a table's location could not be set (connection failed).
+constexpr int32_t TableConnectionFailed = static_cast<int32_t>(0x80047E44);
+/// Runtime: a server error while reading records; rewritten to 0x80047E53 when the
+/// description does not carry the provider code 0x80004005.
+constexpr int32_t ServerError = static_cast<int32_t>(0x80047E52);
+constexpr int32_t ServerErrorRewritten = static_cast<int32_t>(0x80047E53);
+/// Runtime: a report file could not be opened.
+constexpr int32_t OpenReportFailed = static_cast<int32_t>(0x80047689);
+/// Runtime: generic failure of a report operation.
+constexpr int32_t RuntimeFailure = static_cast<int32_t>(0x80040309);
 
-    // Language runtime errors.
-    constexpr int32_t InvalidProcedureCall = 5;
-    constexpr int32_t Overflow = 6;
-    constexpr int32_t SubscriptOutOfRange = 9;
-    constexpr int32_t TypeMismatch = 13;
-    constexpr int32_t FileNotFound = 53;
-    constexpr int32_t ObjectVariableNotSet = 91;
-    constexpr int32_t ObjectDoesNotSupport = 438;
-    constexpr int32_t DuplicateKey = 457;
+// Language runtime errors.
+constexpr int32_t InvalidProcedureCall = 5;
+constexpr int32_t Overflow = 6;
+constexpr int32_t OutOfMemory = 7;
+constexpr int32_t SubscriptOutOfRange = 9;
+constexpr int32_t TypeMismatch = 13;
+constexpr int32_t FileNotFound = 53;
+constexpr int32_t ObjectVariableNotSet = 91;
+constexpr int32_t InvalidPatternString = 93;
+constexpr int32_t InvalidUseOfNull = 94;
+constexpr int32_t ObjectDoesNotSupport = 438;
+constexpr int32_t DuplicateKey = 457;
+/// Scripting.Dictionary: Remove of a key that is not there.
+constexpr int32_t ElementNotFound = 32811;
 } // namespace ErrorNumber
 
 /// An automation error: what Err.Raise raises and an error trap catches. The description

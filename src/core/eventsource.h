@@ -3,8 +3,8 @@
 #include "variant.h"
 
 #include <QString>
-
 #include <functional>
+#include <memory>
 #include <span>
 #include <vector>
 
@@ -15,7 +15,8 @@ namespace core {
 /// into the arguments. Handlers run in the order they were connected.
 class EventSource {
 public:
-    using Handler = std::function<void(int32_t dispid, const QString& name, std::span<Variant> args)>;
+    using Handler
+        = std::function<void(int32_t dispid, const QString& name, std::span<Variant> args)>;
 
     /// Returns a cookie for disconnect.
     int connect(Handler handler);
@@ -30,8 +31,21 @@ private:
         int cookie;
         Handler handler;
     };
+    /// Lets raise() notice that a handler destroyed this source; a copy gets its own.
+    struct Lifetime {
+        std::shared_ptr<char> token = std::make_shared<char>();
+        Lifetime() = default;
+        Lifetime(const Lifetime&)
+            : Lifetime()
+        { }
+        Lifetime& operator=(const Lifetime&) { return *this; }
+    };
+
+    bool isConnected(int cookie) const;
+
     std::vector<Connection> m_handlers;
     int m_nextCookie = 1;
+    Lifetime m_lifetime;
 };
 
 } // namespace core

@@ -15,8 +15,8 @@ bool equalsText(const QString& a, const QString& b);
 int inStr(int start, const QString& text, const QString& find, Compare compare = Compare::Binary);
 int inStr(const QString& text, const QString& find, Compare compare = Compare::Binary);
 /// InStrRev: searches backwards from `start` (-1 = end); 1-based, 0 when absent.
-int inStrRev(const QString& text, const QString& find, int start = -1,
-    Compare compare = Compare::Binary);
+int inStrRev(
+    const QString& text, const QString& find, int start = -1, Compare compare = Compare::Binary);
 
 /// Trim / LTrim / RTrim: spaces (U+0020) only, not tabs or line breaks.
 QString trimSpaces(const QString& text);

@@ -5,8 +5,8 @@
 #include <QDateTime>
 #include <QLocale>
 #include <QString>
-
 #include <cstdint>
+#include <iosfwd>
 #include <memory>
 #include <vector>
 
@@ -125,12 +125,15 @@ private:
         int32_t m_int32; // Long and Error
         float m_single;
         double m_double; // Double and Date
-        int64_t m_currency;
+        int64_t m_currency = 0;
     };
     QString m_text;
     ObjectPtr m_object;
     std::shared_ptr<VariantArray> m_array;
 };
+
+/// Prints the type and value ("Integer 5", "String \"abc\"") in test failure messages.
+void PrintTo(const Variant& value, std::ostream* out);
 
 /// A Basic array of Variants with any lower bound per dimension, one or more dimensions.
 /// Elements are stored with the first index varying fastest (column-major, as SAFEARRAY).
@@ -143,7 +146,8 @@ public:
     };
 
     VariantArray() = default; // one dimension, no elements (0 To -1)
-    explicit VariantArray(std::vector<Bound> bounds, VariantType elementType = VariantType::Variant);
+    explicit VariantArray(
+        std::vector<Bound> bounds, VariantType elementType = VariantType::Variant);
     /// A one-dimensional array (lower To lower + size - 1) of the given values.
     static VariantArray fromList(const std::vector<Variant>& values, int32_t lower = 0);
 
