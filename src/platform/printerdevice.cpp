@@ -70,7 +70,7 @@ PrinterDevice::~PrinterDevice()
     if (m_finished || m_partFile.isEmpty())
         return;
     try {
-        if (printerState() == QPrinter::Idle) {
+        if (printerState() == QPrinter::Idle && !m_cancelled) {
             finish();
             return;
         }
@@ -102,8 +102,9 @@ QString PrinterDevice::finish()
 {
     if (m_finished)
         return m_outputPath;
-    if (m_partFile.isEmpty()) {
+    if (m_partFile.isEmpty() || m_cancelled) {
         m_finished = true;
+        discardPartFile();
         return m_outputPath;
     }
 
@@ -142,6 +143,12 @@ QString PrinterDevice::finish()
             raiseAccess(u"the PDF file %1 cannot be created"_s.arg(target));
     }
     raiseAccess(u"no free file name for %1 in the PDF printer folder"_s.arg(m_baseName));
+}
+
+void PrinterDevice::cancel()
+{
+    abort();
+    m_cancelled = true;
 }
 
 void PrinterDevice::discardPartFile()

@@ -17,7 +17,8 @@ class PrintSettings;
 /// folder; finish() gives it its final name "<document>-<yyyyMMdd-hhmmss>-<n>.pdf", with n
 /// the first number that does not name an existing file, so no earlier output is ever
 /// overwritten and no reader sees a half-written PDF. A device destroyed without finish()
-/// still publishes a job whose painting ended normally and removes an unfinished one.
+/// still publishes a job whose painting ended normally and removes an unfinished or cancelled
+/// one.
 class PrinterDevice : public QPrinter {
 public:
     /// Raises ComError 482 (Printer error) when a system printer is no longer installed and
@@ -35,6 +36,10 @@ public:
     /// temporary file is then kept). For system printers: "".
     QString finish();
 
+    /// Cancels the job: nothing of it is published, whether painting goes on or not. (The PDF
+    /// writer cannot abort, so QPrinter::abort() alone would still publish the file.)
+    void cancel();
+
     /// The file name a document gets in the PDF printer's folder, before the time stamp:
     /// the document name without characters that are unsafe in file names, "Document" when
     /// nothing is left.
@@ -50,6 +55,7 @@ private:
     QString m_baseName;
     QDateTime m_started;
     bool m_finished = false;
+    bool m_cancelled = false;
     QString m_outputPath;
 };
 

@@ -128,18 +128,22 @@ void PrintSettings::readFrom(const QPrinter& printer)
         if (source == printer.paperSource())
             m_paperBin = code;
     }
-    switch (printer.duplex()) {
-    case QPrinter::DuplexNone:
-        m_duplex = 1;
-        break;
-    case QPrinter::DuplexLongSide:
-        m_duplex = 2;
-        break;
-    case QPrinter::DuplexShortSide:
-        m_duplex = 3;
-        break;
-    case QPrinter::DuplexAuto:
-        break;
+    // A PDF has no sides: QPrinter forgets the duplex mode there, and the setting is kept
+    // for the printer the job may go to later.
+    if (printer.outputFormat() != QPrinter::PdfFormat) {
+        switch (printer.duplex()) {
+        case QPrinter::DuplexNone:
+            m_duplex = 1;
+            break;
+        case QPrinter::DuplexLongSide:
+            m_duplex = 2;
+            break;
+        case QPrinter::DuplexShortSide:
+            m_duplex = 3;
+            break;
+        case QPrinter::DuplexAuto:
+            break;
+        }
     }
     const QPageLayout layout = printer.pageLayout();
     m_orientation = layout.orientation() == QPageLayout::Landscape ? 2 : 1;

@@ -44,7 +44,7 @@ public:
     /// Configures printer with these settings; it must not be printing yet.
     void applyTo(QPrinter& printer) const;
     /// These settings changed to what printer holds (after a print dialog); settings the
-    /// printer has no code for are kept.
+    /// printer has no code for, and the duplex mode of PDF output, are kept.
     void readFrom(const QPrinter& printer);
 
     friend bool operator==(const PrintSettings&, const PrintSettings&) = default;
