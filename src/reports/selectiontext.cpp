@@ -149,14 +149,16 @@ QString ComposeSelectionFormula(int mode, const QString& originalSel, const QStr
 {
     switch (mode) {
     case 0:
-        return QString(ComponentOnly) + crlf + formulaClause + u')' + crlf + QString(UserAddition);
+        return QString::fromUtf16(ComponentOnly) + crlf + formulaClause + u')' + crlf
+            + QString::fromUtf16(UserAddition);
     case 1:
         return originalSel;
     default:
         if (IsCommentOnly(originalSel))
-            return originalSel + crlf + QString(ComponentClause) + crlf + formulaClause;
-        return QString(AuthorOpen) + crlf + originalSel + crlf + QString(AuthorClose) + crlf
-            + QString(ComponentClause) + crlf + QStringLiteral("AND (") + formulaClause + u')';
+            return originalSel + crlf + QString::fromUtf16(ComponentClause) + crlf + formulaClause;
+        return QString::fromUtf16(AuthorOpen) + crlf + originalSel + crlf
+            + QString::fromUtf16(AuthorClose) + crlf + QString::fromUtf16(ComponentClause) + crlf
+            + QStringLiteral("AND (") + formulaClause + u')';
     }
 }
 
@@ -176,19 +178,19 @@ bool HasSelectionMarkers(const QString& formula)
 {
     const QStringList lines = formula.split(crlf);
     const QString& first = lines.first();
-    if (sameText(first, QString(ComponentOnly)))
+    if (sameText(first, QString::fromUtf16(ComponentOnly)))
         return true;
-    if (sameText(first, QString(AuthorOpen))) {
+    if (sameText(first, QString::fromUtf16(AuthorOpen))) {
         for (qsizetype i = 1; i + 1 < lines.size(); ++i) {
-            if (sameText(lines.at(i), QString(AuthorClose))
-                && sameText(lines.at(i + 1), QString(ComponentClause)))
+            if (sameText(lines.at(i), QString::fromUtf16(AuthorClose))
+                && sameText(lines.at(i + 1), QString::fromUtf16(ComponentClause)))
                 return true;
         }
         return false;
     }
     return first.startsWith(QStringLiteral("//"))
-        && formula.contains(QString(ComponentClause), Qt::CaseInsensitive)
-        && !formula.contains(QString(AuthorClose), Qt::CaseInsensitive);
+        && formula.contains(QString::fromUtf16(ComponentClause), Qt::CaseInsensitive)
+        && !formula.contains(QString::fromUtf16(AuthorClose), Qt::CaseInsensitive);
 }
 
 QString ExtractUserSelection(const QString& formula)
@@ -196,9 +198,9 @@ QString ExtractUserSelection(const QString& formula)
     const QStringList lines = formula.split(crlf);
     const QString& first = lines.first();
 
-    if (sameText(first, QString(ComponentOnly))) {
+    if (sameText(first, QString::fromUtf16(ComponentOnly))) {
         for (qsizetype i = 1; i + 1 < lines.size(); ++i) {
-            if (!sameText(lines.at(i), QString(UserAddition)))
+            if (!sameText(lines.at(i), QString::fromUtf16(UserAddition)))
                 continue;
             QString part = joinLines(lines, i + 1, lines.size());
             if (part.size() < 3)
@@ -211,11 +213,11 @@ QString ExtractUserSelection(const QString& formula)
         return {};
     }
 
-    if (sameText(first, QString(AuthorOpen))) {
+    if (sameText(first, QString::fromUtf16(AuthorOpen))) {
         qsizetype end = lines.size();
         for (qsizetype i = 1; i + 1 < lines.size(); ++i) {
-            if (sameText(lines.at(i), QString(AuthorClose))
-                && sameText(lines.at(i + 1), QString(ComponentClause))) {
+            if (sameText(lines.at(i), QString::fromUtf16(AuthorClose))
+                && sameText(lines.at(i + 1), QString::fromUtf16(ComponentClause))) {
                 end = i;
                 break;
             }
@@ -226,7 +228,8 @@ QString ExtractUserSelection(const QString& formula)
 
     // The author's text stands before the line break that precedes the marker. A marker at
     // the very start leaves no author's text.
-    const qsizetype marker = formula.indexOf(QString(ComponentClause), 0, Qt::CaseInsensitive);
+    const qsizetype marker
+        = formula.indexOf(QString::fromUtf16(ComponentClause), 0, Qt::CaseInsensitive);
     if (marker < 2)
         return {};
     return formula.left(marker - 2);
