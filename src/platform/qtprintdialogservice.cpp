@@ -61,6 +61,8 @@ PrintDialogService::Result QtPrintDialogService::show(const Request& request)
     if (!dialog.parentWidget())
         WindowHandles::setOwner(&dialog, request.ownerWindow);
 
+    // The dialog's PDF entry is the only way to pick the component's PDF printer, so it stays
+    // even when print-to-file is disabled: that printer is a printer, not print-to-file.
     QAbstractPrintDialog::PrintDialogOptions options = QAbstractPrintDialog::PrintShowPageSize
         | QAbstractPrintDialog::PrintCollateCopies | QAbstractPrintDialog::PrintToFile;
     if (request.pageRangeAllowed)

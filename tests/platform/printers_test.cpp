@@ -347,8 +347,9 @@ class CurrentPrinterTest : public PdfPrinterTest {
 protected:
     void TearDown() override
     {
-        platform::CurrentPrinter::instance().select(Printers::defaultPrinter());
+        // Back to the printer other tests start from, with the PDF folder they would see.
         PdfPrinterTest::TearDown();
+        platform::CurrentPrinter::instance().select(Printers::defaultPrinter());
     }
 };
 
