@@ -15,7 +15,7 @@ public:
     QString className() const override { return QStringLiteral("Collection"); }
 
     int32_t count() const { return static_cast<int32_t>(m_entries.size()); }
-    /// Raises 457 when the key is already used.
+    /// Raises 457 when the key is already used; an empty key means no key.
     void add(const Variant& item, const QString& key = QString());
     /// By 1-based position (Subscript out of range, 9) or by key (Invalid procedure call, 5).
     Variant item(const Variant& indexOrKey) const;

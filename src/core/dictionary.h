@@ -22,7 +22,7 @@ public:
 
     int32_t count() const { return static_cast<int32_t>(m_entries.size()); }
     bool exists(const Variant& key) const;
-    /// Raises 457 when the key exists.
+    /// Raises 457 when the key exists, 13 for an array key.
     void add(const Variant& key, const Variant& item);
     /// The item, or Empty when absent (reading adds the key, as Scripting.Dictionary does).
     Variant item(const Variant& key);

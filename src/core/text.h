@@ -11,10 +11,12 @@ enum class Compare { Binary, Text };
 /// Text comparison (Option Compare Text): case-insensitive equality.
 bool equalsText(const QString& a, const QString& b);
 
-/// InStr: 1-based position of `find` in `text` from `start` (1-based), 0 when absent.
+/// InStr: 1-based position of `find` in `text` from `start` (1-based), 0 when absent;
+/// `start` below 1 raises 5.
 int inStr(int start, const QString& text, const QString& find, Compare compare = Compare::Binary);
 int inStr(const QString& text, const QString& find, Compare compare = Compare::Binary);
-/// InStrRev: searches backwards from `start` (-1 = end); 1-based, 0 when absent.
+/// InStrRev: searches backwards from `start` (-1 = end); 1-based, 0 when absent; a match
+/// must end at or before `start`. `start` 0 or below -1 raises 5.
 int inStrRev(
     const QString& text, const QString& find, int start = -1, Compare compare = Compare::Binary);
 
@@ -33,12 +35,16 @@ QString replace(const QString& text, const QString& find, const QString& with,
     Compare compare = Compare::Binary);
 
 /// The Like operator: ? one character, * any run, # one digit, [list] and [!list] with
-/// ranges. Binary compare is case-sensitive; Text is not.
+/// ranges. Binary compare is case-sensitive; Text is not. An unclosed "[" or a descending
+/// range raises 93 ("Invalid pattern string").
 bool like(const QString& text, const QString& pattern, Compare compare = Compare::Binary);
 
 /// Format$ for dates with the pattern letters d, dd, m, mm (month; minutes after h),
 /// yy, yyyy, h, hh, n, nn, s, ss, in any letter case, and "/" (the locale date separator)
 /// ":" "." "-" " " as literals. Example: format(dt, "DDYYMMHHNNSS") -> "042612224831".
+/// Also: ddd/dddd and mmm/mmmm (locale day and month names), y (day of the year),
+/// AM/PM, am/pm, A/P, a/p and AMPM (locale designators) for a 12-hour clock, "quoted" and
+/// \escaped literals. An invalid date-time gives "".
 QString format(const QDateTime& value, const QString& pattern);
 
 /// The date separator of the user's short-date format (what Format$(date, "/") gives).

@@ -62,11 +62,16 @@ public:
     Variant(const char16_t* value);
     Variant(ObjectPtr value); // a null pointer is Nothing
     Variant(const VariantArray& value);
+    /// Any other pointer (a char literal, a raw object pointer) would silently become a
+    /// Boolean: refuse it at compile time.
+    template <class T> Variant(const T*) = delete;
 
     static Variant null();
-    static Variant fromDate(double oleDate); // days since 1899-12-30, fraction = time of day
-    static Variant fromDateTime(const QDateTime& value); // local time
-    static Variant fromDate(const QDate& value);
+    /// Days since 1899-12-30, the fraction being the time of day (for negative days too:
+    /// -1.25 is 1899-12-29 06:00). Overflow (6) outside 0100-01-01 to 9999-12-31.
+    static Variant fromDate(double oleDate);
+    static Variant fromDateTime(const QDateTime& value); // local time; invalid gives Null
+    static Variant fromDate(const QDate& value); // invalid gives Null
     /// The error value Basic passes for an omitted optional argument.
     static Variant missing();
     static Variant error(int32_t scode);
@@ -94,7 +99,9 @@ public:
     Currency toCurrency() const;
     double toDate() const; // OLE date
     QDateTime toDateTime() const; // local time
-    QString toText() const; // CStr, locale-aware
+    /// CStr, locale-aware: Doubles with up to 15 significant digits ("0.1", "1E+20"), dates
+    /// as the short date with a four-digit year and/or the time with seconds.
+    QString toText() const;
     /// Like toText but with invariant number and date forms ("5.5", "2026-12-06"): for
     /// text that goes into formulas or SQL.
     QString toInvariantText() const;
