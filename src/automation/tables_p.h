@@ -1,0 +1,21 @@
+#pragma once
+
+// The dispatch tables of the component, one function per class, each in its own
+// <class>dispatch.cpp. A new class adds its function here and to registerComponentTables.
+
+namespace automation {
+
+class Registry;
+
+void registerEnumerations(Registry& registry);
+
+// Platform and runtime classes: described for late binding, not in the type library.
+void registerDictionary(Registry& registry);
+void registerCollection(Registry& registry);
+void registerEnumerator(Registry& registry);
+void registerRuntimeReport(Registry& registry);
+
+/// Adds every table above to the registry, the type library's classes in library order.
+void registerComponentTables(Registry& registry);
+
+} // namespace automation
