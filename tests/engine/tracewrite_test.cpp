@@ -1,0 +1,49 @@
+#include "enginetest.h"
+
+#include <QFile>
+#include <QRegularExpression>
+#include <QTemporaryDir>
+
+namespace enginetest {
+namespace {
+
+QString contents(const QString& path)
+{
+    QFile file(path);
+    if (!file.open(QIODevice::ReadOnly))
+        return QString();
+    return QString::fromUtf8(file.readAll());
+}
+
+TEST(TraceWrite, AppendsStampedLinesOnlyWhenEnabled)
+{
+    QTemporaryDir folder;
+    ASSERT_TRUE(folder.isValid());
+    const QString path = folder.filePath(u"trace.log"_s);
+
+    engine::TraceWrite(u"off"_s, path, false);
+    EXPECT_FALSE(QFile::exists(path));
+
+    engine::TraceWrite(u"+\r\nMoxEngine_Initialize"_s, path, true);
+    engine::TraceWrite(u"second"_s, path, true);
+
+    const QRegularExpression stamp(u"^\\S.*\\d \\d\\d:\\d\\d:\\d\\d $"_s);
+    const QStringList lines = contents(path).split(u"\r\n"_s);
+    ASSERT_EQ(lines.size(), 4) << contents(path).toStdString(); // the last is empty
+    EXPECT_TRUE(lines[0].endsWith(u" +"_s));
+    EXPECT_TRUE(stamp.match(lines[0].chopped(1)).hasMatch()) << lines[0].toStdString();
+    EXPECT_EQ(lines[1], u"MoxEngine_Initialize"_s);
+    EXPECT_TRUE(lines[2].endsWith(u" second"_s));
+    EXPECT_EQ(lines[3], QString());
+}
+
+TEST(TraceWrite, UnwritableFileLosesTheLineQuietly)
+{
+    QTemporaryDir folder;
+    const QString path = folder.filePath(u"missing/trace.log"_s);
+    engine::TraceWrite(u"lost"_s, path, true);
+    EXPECT_FALSE(QFile::exists(path));
+}
+
+} // namespace
+} // namespace enginetest
