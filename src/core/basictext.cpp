@@ -884,6 +884,14 @@ QString formatDateTime(
     const std::vector<FormatToken> tokens = tokenizeFormat(pattern, dateSep);
     const bool twelveHours = std::any_of(tokens.begin(), tokens.end(),
         [](const FormatToken& token) { return token.kind == FormatToken::DayHalf; });
+    // Languages that inflect month names ("4. joulukuuta", but "joulukuu" alone) take the
+    // inflected form next to a day number.
+    const bool hasDayNumber
+        = std::any_of(tokens.begin(), tokens.end(), [](const FormatToken& token) {
+              return token.kind == FormatToken::Day && token.count <= 2;
+          });
+    const auto monthFormat
+        = [](qsizetype count) { return count == 3 ? QLocale::ShortFormat : QLocale::LongFormat; };
     QString text;
     for (const FormatToken& token : tokens) {
         switch (token.kind) {
@@ -904,9 +912,10 @@ QString formatDateTime(
         case FormatToken::Month:
             if (token.count <= 2)
                 text += padded(date.month(), token.count);
+            else if (hasDayNumber)
+                text += locale.monthName(date.month(), monthFormat(token.count));
             else
-                text += locale.monthName(
-                    date.month(), token.count == 3 ? QLocale::ShortFormat : QLocale::LongFormat);
+                text += locale.standaloneMonthName(date.month(), monthFormat(token.count));
             break;
         case FormatToken::Year:
             if (token.count == 1)

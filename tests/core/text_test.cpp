@@ -135,6 +135,8 @@ TEST(TextFormat, DatePatterns)
         { "day and month names", u"en_US", u"dddd d mmmm", u"Friday 4 December" },
         { "short names", u"en_US", u"ddd mmm", u"Fri Dec" },
         { "day of the year", u"en_US", u"y", u"338" },
+        { "Finnish month alone", u"fi_FI", u"mmmm", u"joulukuu" },
+        { "Finnish month after a day is inflected", u"fi_FI", u"d. mmmm", u"4. joulukuuta" },
         { "quoted and escaped literals", u"en_US", u"\"day\" d \\h", u"day 4 h" },
     };
     for (const Case& row : cases) {
