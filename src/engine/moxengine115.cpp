@@ -7,6 +7,7 @@
 #include "platform/currentprinter.h"
 #include "platform/printers.h"
 #include "platform/tempfolder.h"
+#include "reports/moxreports115.h"
 #include "runtime/application.h"
 #include "runtime/databasetable.h"
 #include "runtime/parameterfield.h"
@@ -124,6 +125,17 @@ bool MoxEngine115::SetLogonInfo(MoxServerTypes ServerType, const QString& Server
     }
     mIntegratedSecurity = mUserID.isEmpty() || mUserID.contains(u'\\');
     return true;
+}
+
+std::shared_ptr<reports::MoxReports115> MoxEngine115::GetReports()
+{
+    try {
+        auto collection = std::make_shared<reports::MoxReports115>();
+        collection->SetEngine(std::static_pointer_cast<MoxEngine115>(shared_from_this()));
+        return collection;
+    } catch (...) {
+        return nullptr;
+    }
 }
 
 void MoxEngine115::SetDialogParentWindow(int32_t hWnd)

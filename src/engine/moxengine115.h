@@ -14,6 +14,10 @@ class Report;
 class ReportObject;
 } // namespace runtime
 
+namespace reports {
+class MoxReports115;
+}
+
 namespace engine {
 
 /// The object a host creates first: the user-interface settings every dialog reads, the
@@ -65,6 +69,11 @@ public:
     /// regard to case); Empty for any other key and on any failure. Also used internally by
     /// the report objects.
     core::Variant Properties(const QString& PropName);
+
+    /// A new, empty report collection that keeps this engine alive; every call gives another
+    /// one. Nothing when the collection cannot be made (also when the engine is not owned by
+    /// a std::shared_ptr).
+    std::shared_ptr<reports::MoxReports115> GetReports();
 
     void SetDialogParentWindow(int32_t hWnd);
 

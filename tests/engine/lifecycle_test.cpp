@@ -1,5 +1,6 @@
 #include "engine/luderrorhandler.h"
 #include "enginetest.h"
+#include "reports/moxreports115.h"
 
 #include <QFile>
 #include <sys/mman.h>
@@ -130,6 +131,36 @@ TEST_F(EngineLifecycle, CanUnloadIsFalseWhenTheRuntimeCannotBeAsked)
     auto engine = makeEngine();
     fake.failOn(u"ApplicationFactory.create"_s, core::ComError(429, u"x"_s, u"no runtime"_s));
     EXPECT_FALSE(engine->CanUnload());
+}
+
+TEST_F(EngineLifecycle, EveryGetReportsGivesAnotherEmptyCollectionThatKeepsTheEngine)
+{
+    const int32_t before = engine::gEngineCount;
+    auto engine = makeEngine();
+    const std::weak_ptr<engine::MoxEngine115> weakEngine = engine;
+    auto first = engine->GetReports();
+    auto second = engine->GetReports();
+    ASSERT_NE(first, nullptr);
+    ASSERT_NE(second, nullptr);
+    EXPECT_NE(first, second);
+    first->Item(u"orders.rpt"_s);
+    EXPECT_EQ(first->NewEnum().size(), 1u);
+    EXPECT_TRUE(second->NewEnum().empty());
+    EXPECT_EQ(second->GetEngine(), engine);
+
+    // The host lets go of the engine; its collections keep it.
+    engine.reset();
+    first.reset();
+    EXPECT_FALSE(weakEngine.expired());
+    second.reset();
+    EXPECT_TRUE(weakEngine.expired());
+    EXPECT_EQ(engine::gEngineCount, before);
+}
+
+TEST_F(EngineLifecycle, EngineNotSharedGivesNoCollection)
+{
+    engine::MoxEngine115 engine;
+    EXPECT_EQ(engine.GetReports(), nullptr);
 }
 
 } // namespace
