@@ -139,6 +139,22 @@ public:
         return *this;
     }
 
+    /// A property whose getter and setter share one overloaded name, picked by the value
+    /// type: `c.property<bool>(u"ConnectionFailed"_s, 0x68030005, &MoxEngine115::
+    /// ConnectionFailed, &MoxEngine115::ConnectionFailed)`.
+    template <class T, class K>
+    ClassBuilder& property(const QString& name, int32_t dispid, T (K::*getter)() const,
+        void (K::*setter)(T), MemberOptions options = {})
+    {
+        return property<decltype(getter), decltype(setter)>(name, dispid, getter, setter, options);
+    }
+    template <class T, class K>
+    ClassBuilder& property(const QString& name, int32_t dispid, T (K::*getter)() const,
+        void (K::*setter)(const T&), MemberOptions options = {})
+    {
+        return property<decltype(getter), decltype(setter)>(name, dispid, getter, setter, options);
+    }
+
     /// A public field: read and written as a property.
     template <class T, class K>
     ClassBuilder& field(
@@ -165,7 +181,7 @@ public:
                 throw DispatchError::memberNotFound(self.className(), QStringLiteral("_NewEnum"));
             std::vector<core::Variant> values;
             for (const auto& value : std::invoke(items, *object))
-                values.push_back(value);
+                values.push_back(detail::Arg<detail::Plain<decltype(value)>>::to(value));
             return core::Variant(core::ObjectPtr(std::make_shared<Enumerator>(std::move(values))));
         };
         m_description.members.push_back(std::move(description));

@@ -6,6 +6,12 @@ void registerComponentTables(Registry& registry)
 {
     registerEnumerations(registry);
 
+    registerMoxEngine115(registry);
+    registerMoxReports115(registry);
+    registerMoxStatus115(registry);
+    registerMoxEvents115(registry);
+    registerMoxReport115(registry);
+
     registerDictionary(registry);
     registerCollection(registry);
     registerEnumerator(registry);

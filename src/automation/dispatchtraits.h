@@ -152,7 +152,16 @@ template <class L, class R, class Self, class... A>
 struct FunctionObject<R (L::*)(Self, A...) const noexcept>
     : FunctionObject<R (L::*)(Self, A...) const> { };
 
+/// A plain function whose first parameter is the object.
+template <class R, class Self, class... A> struct FreeFunction {
+    using Class = std::remove_cvref_t<Self>;
+    using Result = R;
+    using Args = TypeList<A...>;
+};
+
 template <class F> struct Callable : FunctionObject<decltype(&F::operator())> { };
+template <class R, class Self, class... A>
+struct Callable<R (*)(Self, A...)> : FreeFunction<R, Self, A...> { };
 template <class F>
 requires std::is_member_function_pointer_v<F>
 struct Callable<F> : MemberFunction<F> {

@@ -9,6 +9,13 @@ class Registry;
 
 void registerEnumerations(Registry& registry);
 
+// The component's classes, in the type library's order.
+void registerMoxEngine115(Registry& registry);
+void registerMoxReports115(Registry& registry);
+void registerMoxStatus115(Registry& registry);
+void registerMoxEvents115(Registry& registry);
+void registerMoxReport115(Registry& registry);
+
 // Platform and runtime classes: described for late binding, not in the type library.
 void registerDictionary(Registry& registry);
 void registerCollection(Registry& registry);
