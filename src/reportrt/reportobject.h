@@ -1,0 +1,55 @@
+#pragma once
+
+#include "reportdocument.h"
+#include "runtime/reportobject.h"
+
+#include <QImage>
+#include <memory>
+
+namespace reportrt {
+
+class Report;
+class Section;
+
+/// A report object of an opened report. Type names: "ITextObject", "IFieldObject"
+/// (database, formula and parameter fields, special fields, summaries), "ILineObject",
+/// "IBoxObject", "ICROleObject" (pictures), "IBlobFieldObject", "ISubreportObject".
+class ReportObject : public runtime::ReportObject {
+public:
+    ReportObject(ObjectDefinition definition, std::weak_ptr<Section> section);
+
+    QString typeName() const override;
+    QString name() const override { return m_definition.name; }
+    std::shared_ptr<runtime::Section> section() const override;
+
+    int32_t left() const override { return m_definition.left; }
+    int32_t top() const override { return m_definition.top; }
+    int32_t width() const override { return m_definition.width; }
+    int32_t height() const override { return m_definition.height; }
+    /// Positions and sizes are 0 to 1,000,000 twips; others raise Error::RuntimeFailure.
+    void setLeft(int32_t twips) override;
+    void setTop(int32_t twips) override;
+    void setWidth(int32_t twips) override;
+    void setHeight(int32_t twips) override;
+
+    std::shared_ptr<runtime::Report> openSubreport() override;
+    QImage picture() const override;
+    void setPicture(const QImage& picture) override;
+    QString fieldName() const override;
+    /// The field's value for the record being formatted; Empty outside formatting.
+    core::Variant value() const override;
+
+    /// The object as a document stores it (the picture as PNG when it was changed).
+    ObjectDefinition definition() const;
+    ObjectDefinition::Kind kind() const { return m_definition.kind; }
+
+private:
+    ObjectDefinition m_definition;
+    std::weak_ptr<Section> m_section;
+    mutable QImage m_picture;
+    mutable bool m_pictureLoaded = false;
+    bool m_pictureChanged = false;
+    std::shared_ptr<Report> m_subreport;
+};
+
+} // namespace reportrt
