@@ -1,20 +1,45 @@
 #pragma once
 
 #include "core/object.h"
+#include "core/variant.h"
 
 #include <QString>
+#include <cstdint>
 #include <memory>
+
+namespace core {
+class Collection;
+class Dictionary;
+} // namespace core
+
+namespace engine {
+class MoxEngine115;
+}
+
+namespace runtime {
+class ParameterField;
+class Report;
+} // namespace runtime
 
 namespace reports {
 
+class MoxEvents115;
 class MoxReports115;
+class MoxStatus115;
 struct MoxReport115Private;
+struct SectionBinding;
 
 /// One report file of a collection. The collection creates it, names it and points it back
-/// at itself; the file is opened only when an operation first needs it.
+/// at itself; the file is opened only when an operation first needs it (LoadReport), and
+/// every operation that needs the open report loads it first.
 ///
 /// The report does not keep its collection alive: once the host has released the
-/// collection, GetParent returns nothing and the report can no longer reach its engine.
+/// collection, GetParent returns nothing and the report can no longer reach its engine, so
+/// it can no longer be loaded (error 91).
+///
+/// Members that report through a Boolean result never raise; CheckOLEDB, C_Report,
+/// CheckEditedSelection, SetParameters, GetParamsCollection and GetParamsDictionary pass
+/// the runtime's errors on to the caller.
 class MoxReport115 : public core::Object {
 public:
     MoxReport115();
@@ -27,6 +52,102 @@ public:
     /// The report file name exactly as the host passed it to the collection's Item.
     QString FileName() const;
 
+    // Flags and settings a host reads and writes.
+
+    /// True: a print or export that selects no record still counts as having data.
+    bool IgnoreNoDataCheck() const;
+    void IgnoreNoDataCheck(bool value);
+    /// Set when a load fails or the user cancels the parameter dialog.
+    bool UnloadRequest() const;
+    void UnloadRequest(bool value);
+    /// The viewer shows this report.
+    bool PreviewActive() const;
+    void PreviewActive(bool value);
+    /// Device name of the printer to print on.
+    QString DefaultPrinter() const;
+    void DefaultPrinter(const QString& value);
+    /// Paper size code to use with DefaultPrinter; 0 leaves the paper as it is.
+    int16_t DefaultPaperSize() const;
+    void DefaultPaperSize(int16_t value);
+    /// Stored for hosts; saving for editing is refused while it is true.
+    bool UseOldCrystal() const;
+    void UseOldCrystal(bool value);
+    /// Stored for hosts; mail is sent only while it is true.
+    bool ValidMail() const;
+    void ValidMail(bool value);
+    bool SendMailError() const;
+    bool SaveAsPDFError() const;
+    bool SaveAsXLSError() const;
+
+    /// The number of top groups in effect: -1 when none was requested or the report does
+    /// not sort its first group by top N.
+    int32_t TopNGroups() const;
+    /// Requests N top groups (0 or less: all groups); applied at once to an open report.
+    void TopNGroups(int32_t N);
+
+    /// The report's event source, created on first use.
+    std::shared_ptr<MoxEvents115> MoxEvents();
+    /// A snapshot of print progress: Progress 0 while the report is not open; nothing when
+    /// the runtime cannot tell.
+    std::shared_ptr<MoxStatus115> Status();
+    /// Loads the report and returns the runtime's report object itself; nothing when the
+    /// load fails without an error (for example a report not read through OLE DB).
+    std::shared_ptr<runtime::Report> C_Report();
+    /// Opens the file when needed and tells whether its first table is read through the
+    /// OLE DB driver; a report that is not stays closed. Runtime errors reach the caller.
+    bool CheckOLEDB();
+    /// Closes the runtime report; names, selection, top N, printer settings and error flags
+    /// stay, so the next operation reopens the same file with the same settings. The host's
+    /// parameter values are dropped unless DontResetParameters. Always true.
+    bool CloseReport(bool& DontResetParameters);
+    bool CloseReport();
+    /// Kept for hosts of an earlier version; does nothing.
+    void CloseReport8();
+
+    // Record selection.
+
+    /// Restricts the report to records of TableName: an array or collection of ids, one
+    /// numeric id, a formula clause (text starting with "{"), or an SQL condition;
+    /// Empty clears the request for good, Null builds nothing. SpecialSelection holds
+    /// further SQL conditions separated by ";". Applied at once to an open report.
+    /// False on a runtime error.
+    bool SetSelection(const QString& TableName, const core::Variant& Selection,
+        const QString& SpecialSelection = QString());
+    /// Saves the open report for editing, with the author's selection and statement back in
+    /// place and the component's clause between its markers. False on any failure, when
+    /// the report is not open or with UseOldCrystal.
+    bool SaveReport(const QString& FileName);
+    /// Reads the selection formula of an edited copy: EditedSel becomes the author's part
+    /// when the markers are intact (true); false when they were damaged. OriginalSel and
+    /// SavedSel receive the stored texts. Runtime errors reach the caller.
+    bool CheckEditedSelection(
+        QString& FileName, QString& OriginalSel, QString& SavedSel, QString& EditedSel);
+    /// Puts an edited copy in place of this report's file, with Selection (or the stored
+    /// author's formula) as its selection formula; the next operation opens the new file.
+    /// False on any failure or with UseOldCrystal.
+    bool ReplaceEdited(
+        const QString& FileName, const core::Variant& Selection = core::Variant::missing());
+
+    // Parameters.
+
+    /// The host's parameter values (name to value or array of values), held by reference;
+    /// re-applied at once to an open report. False on any failure, including a cancelled
+    /// parameter dialog.
+    bool SetParams(const std::shared_ptr<core::Dictionary>& Parameters);
+    /// Gives every parameter of the open report its value: from the host's dictionary,
+    /// from the host's answer to QueryParameters ("LUD#" prompts), then from the input
+    /// dialog unless NoDialog. Raises "User Cancelled" (0x80040099) after setting
+    /// UnloadRequest when the user cancels the dialog; other errors pass on unchanged.
+    /// Cancelled is not written.
+    void SetParameters(bool& Cancelled, bool NoDialog = false);
+    /// One two-element array (name, prompting text) per parameter, in the report's order.
+    std::shared_ptr<core::Collection> GetParamsCollection();
+    /// The same pairs keyed "0", "1", ... (binary compare).
+    std::shared_ptr<core::Dictionary> GetParamsDictionary();
+    /// Kept in the interface for hosts; shows nothing and returns Empty.
+    core::Variant ShowLUDInputBox(
+        core::Variant& Params, int32_t& Buttons, QString& Title, bool& Result);
+
     // Internal operations for the component's own objects.
 
     /// Set once by the collection right after creating the report.
@@ -35,8 +156,54 @@ public:
     void SetParent(const std::weak_ptr<MoxReports115>& parent);
     /// The collection, or nothing when the report was removed or the collection has ended.
     std::shared_ptr<MoxReports115> GetParent() const;
+    /// The runtime report object without loading it.
+    std::shared_ptr<runtime::Report> GetReport() const;
+    /// Opens and prepares the report when needed (OLE DB check, logon, table locations,
+    /// parameters, selection, top N). False, with UnloadRequest set, when the report cannot
+    /// be used; a runtime error or a cancelled parameter dialog is raised after the same
+    /// clean-up. A call made while loading is under way returns false at once.
+    bool LoadReport(bool Refresh, bool& NoDialog);
+    /// Applies N top groups to the open report; the count in effect, or -1.
+    int32_t ApplyTopNGroups(int32_t N);
+    /// Keeps the first current value of every parameter, discards the saved data and puts
+    /// the values back; with KeepNothing only discards. Never raises.
+    bool ReloadKeepingParameters(bool KeepNothing);
+    /// Gives each parameter its kept value (ReloadKeepingParameters). Never raises.
+    bool RestoreParameterValues();
+    /// Whether the last read selected no record (the runtime's no-data event), unless
+    /// IgnoreNoDataCheck.
+    bool NoData() const;
 
 private:
+    // Loading.
+    /// The collection's engine; raises 91 when the report has none.
+    std::shared_ptr<engine::MoxEngine115> owningEngine() const;
+    /// Opens FileName into mReport and checks its driver (checkOleDbDriver).
+    bool openReportFile();
+    /// Whether the first table of mReport is read through OLE DB; releases it when not.
+    bool checkOleDbDriver();
+    void releaseReport();
+    void bindSections();
+    void unbindSections();
+    static void unbind(SectionBinding& binding);
+    void raiseErrorOccured();
+    void mReport_NoData(bool& pCancel);
+    void mSection_format();
+    void mPictureSection_format();
+    void mBlobPictureSection_format();
+
+    // Selection.
+    void ApplySqlSelection();
+    void applySelectionFormula();
+
+    // Parameters.
+    /// Opens the file for reading its parameter list only, when it is not open yet.
+    void openReportForParameters();
+    core::Variant LookupParamValue(const QString& name) const;
+    static bool IsLUDPrompt(const QString& prompt);
+    void applyAnswer(runtime::ParameterField& parameter, const core::Variant& answer);
+    static void applyHostValue(runtime::ParameterField& parameter, const core::Variant& value);
+
     // The report's state lives in a private header so that the report's operations, spread
     // over several source files, share it without the public header growing with it.
     std::unique_ptr<MoxReport115Private> d;
