@@ -16,14 +16,6 @@ namespace {
 using reports::MoxReport115;
 using reports::MoxReports115;
 
-std::shared_ptr<MoxReports115> attachedCollection(
-    const std::shared_ptr<engine::MoxEngine115>& owner)
-{
-    auto collection = std::make_shared<MoxReports115>();
-    collection->SetEngine(owner);
-    return collection;
-}
-
 QStringList fileNames(const MoxReports115& collection)
 {
     QStringList names;
@@ -35,7 +27,7 @@ QStringList fileNames(const MoxReports115& collection)
 class ReportsCollection : public ::testing::Test {
 protected:
     std::shared_ptr<engine::MoxEngine115> m_engine = std::make_shared<engine::MoxEngine115>();
-    std::shared_ptr<MoxReports115> m_reports = attachedCollection(m_engine);
+    std::shared_ptr<MoxReports115> m_reports = m_engine->GetReports();
 };
 
 TEST_F(ReportsCollection, ItemFindsANameInAnyLetterCaseAndKeepsTheFirstSpelling)
@@ -124,9 +116,11 @@ TEST(ReportsCollectionWithoutEngine, ItemAndRemoveDoNothing)
     EXPECT_TRUE(reports->NewEnum().empty()) << "a collection not yet attached is empty, not gone";
 }
 
-TEST_F(ReportsCollection, CollectionsOfOneEngineAreIndependent)
+TEST_F(ReportsCollection, EachGetReportsHandsOutAnIndependentCollection)
 {
-    const auto other = attachedCollection(m_engine);
+    const auto other = m_engine->GetReports();
+    ASSERT_NE(other, m_reports);
+    EXPECT_EQ(other->GetEngine(), m_engine);
     const auto mine = m_reports->Item(u"a.rpt"_s);
     const auto theirs = other->Item(u"a.rpt"_s);
     ASSERT_TRUE(mine && theirs);
