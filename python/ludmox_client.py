@@ -1,0 +1,641 @@
+"""Host library for ludmoxd, the LUD Mox automation server.
+
+Starts ``ludmoxd`` and talks JSON-RPC 2.0 with it over its standard input and output.
+Objects of the component come back as proxies with attribute access by member name::
+
+    from ludmox_client import Client
+
+    with Client() as mox:                      # ludmoxd from $LUDMOX_LUDMOXD or the PATH
+        engine = mox.create("MoxEngine115")
+        engine.Init(3, True, 0, 0)
+        engine.SetLogonInfo(2, "server", "database", "user", "password")
+        report = engine.GetReports().Item("/reports/orders.rpt")
+        report.DefaultPrinter = "PDF"
+        print(report.Status.Progress)
+
+Reading an attribute reads a property or gives a callable method; assigning an attribute
+assigns the property. Values map as follows: ``None`` is Null, ``EMPTY`` is Empty,
+``NOTHING`` is an empty object reference, ``MISSING`` skips an optional argument,
+``decimal.Decimal`` is Currency, ``datetime.datetime`` is Date (local time), lists and
+tuples are zero-based arrays (``Array`` and ``Array2D`` carry other bounds).
+
+Errors of the component and of the call itself raise ``ComError`` with ``number``,
+``source`` and ``description``. Events reach handlers registered with ``Client.on``; a
+handler may change by-reference arguments through ``event.args`` and may call back into
+the component.
+
+Standard library only.
+"""
+
+import datetime
+import decimal
+import json
+import os
+import subprocess
+import weakref
+
+__all__ = [
+    "Array", "Array2D", "Client", "ComError", "EMPTY", "ErrorValue", "Event", "MISSING",
+    "NOTHING", "Proxy",
+]
+
+# JSON-RPC error codes the server answers with.
+COMPONENT_ERROR = -32000
+INVALID_REQUEST = -32600
+METHOD_NOT_FOUND = -32601
+INVALID_PARAMS = -32602
+PARSE_ERROR = -32700
+
+
+class ComError(Exception):
+    """An error answer: the component's error (``code`` -32000) or a failed call.
+
+    ``number`` is the error number as a signed 32-bit value: the component's own number,
+    or the dispatch error number (0x80020003 member not found, 0x80020005 type mismatch,
+    0x8002000E bad parameter count, 0x8002000F parameter not optional) of a call that did
+    not reach the member, or the JSON-RPC code when neither applies.
+    """
+
+    def __init__(self, number, source, description, code=None, data=None):
+        super().__init__(number, source, description)
+        self.number = number
+        self.source = source
+        self.description = description
+        self.code = code
+        self.data = data
+
+    def __str__(self):
+        return f"{self.number}, {self.source}, {self.description}"
+
+
+class _Singleton:
+    def __init__(self, name):
+        self._name = name
+
+    def __repr__(self):
+        return self._name
+
+    def __bool__(self):
+        return False
+
+
+EMPTY = _Singleton("EMPTY")
+"""The Empty value (an uninitialised Variant)."""
+NOTHING = _Singleton("NOTHING")
+"""An object reference to no object."""
+MISSING = _Singleton("MISSING")
+"""An omitted optional argument; the member takes its declared default."""
+
+
+class ErrorValue:
+    """A Variant holding an error code (other than a missing argument)."""
+
+    def __init__(self, code):
+        self.code = code
+
+    def __eq__(self, other):
+        return isinstance(other, ErrorValue) and other.code == self.code
+
+    def __hash__(self):
+        return hash(("ErrorValue", self.code))
+
+    def __repr__(self):
+        return f"ErrorValue({self.code})"
+
+
+class Array(list):
+    """A one-dimensional array with a lower bound other than zero."""
+
+    def __init__(self, values=(), lbound=0):
+        super().__init__(values)
+        self.lbound = lbound
+
+    def __eq__(self, other):
+        return (isinstance(other, list) and list.__eq__(self, other)
+                and getattr(other, "lbound", 0) == self.lbound)
+
+    __hash__ = None
+
+    def __repr__(self):
+        return f"Array({list.__repr__(self)}, lbound={self.lbound})"
+
+
+class Array2D(list):
+    """A two-dimensional array: a list of rows over the first dimension, with its bounds
+    ``((lower1, upper1), (lower2, upper2))``; element (i, j) is ``self[i - lower1][j - lower2]``."""
+
+    def __init__(self, rows=(), bounds=None):
+        super().__init__([list(row) for row in rows])
+        if bounds is None:
+            columns = len(self[0]) if self else 0
+            bounds = ((0, len(self) - 1), (0, columns - 1))
+        self.bounds = tuple(tuple(pair) for pair in bounds)
+
+    def __eq__(self, other):
+        return (isinstance(other, list) and list.__eq__(self, other)
+                and getattr(other, "bounds", None) == self.bounds)
+
+    __hash__ = None
+
+    def __repr__(self):
+        return f"Array2D({list.__repr__(self)}, bounds={self.bounds})"
+
+
+class Event:
+    """One event raised by the component. Handlers change by-reference arguments by
+    assigning to ``args``; assignments to by-value arguments are ignored by the server."""
+
+    def __init__(self, source, name, dispid, args):
+        self.source = source
+        self.name = name
+        self.dispid = dispid
+        self.args = args
+
+    def __repr__(self):
+        return f"Event({self.name!r}, {self.args!r})"
+
+
+# Classes the component hands out that its type library does not list, by member kind.
+_PLATFORM_CLASSES = {
+    "Scripting.Dictionary": {
+        "item": "indexed", "add": "method", "count": "property", "exists": "method",
+        "items": "method", "keys": "method", "remove": "method", "removeall": "method",
+        "comparemode": "property",
+    },
+    "Collection": {
+        "item": "method", "add": "method", "count": "method", "remove": "method",
+    },
+}
+
+
+class Proxy:
+    """A component object held by the host. The same object always comes back as the same
+    proxy; the server's references are given back when the proxy is garbage-collected or
+    released with ``Client.release``."""
+
+    __slots__ = ("_client", "_handle", "_class", "_refs", "__weakref__")
+
+    def __init__(self, client, handle, class_name=None):
+        object.__setattr__(self, "_client", client)
+        object.__setattr__(self, "_handle", handle)
+        object.__setattr__(self, "_class", class_name)
+        object.__setattr__(self, "_refs", 1)
+
+    @property
+    def handle(self):
+        return self._handle
+
+    @property
+    def class_name(self):
+        """The class as far as the host can tell (from the type library), or None."""
+        return self._class
+
+    def __getattr__(self, name):
+        if name.startswith("_"):
+            raise AttributeError(name)
+        kind = self._client._member_kind(self._class, name)
+        if kind == "property":
+            return self._client.invoke(self, name, kind="get")
+        return _BoundMember(self, name, kind)
+
+    def __setattr__(self, name, value):
+        if name.startswith("_"):
+            object.__setattr__(self, name, value)
+            return
+        kind = "putref" if isinstance(value, Proxy) or value is NOTHING else "put"
+        self._client.invoke(self, name, value, kind=kind)
+
+    def __getitem__(self, key):
+        args = key if isinstance(key, tuple) else (key,)
+        return self._client._call_default(self, None, args)
+
+    def __setitem__(self, key, value):
+        args = (key if isinstance(key, tuple) else (key,)) + (value,)
+        kind = "putref" if isinstance(value, Proxy) or value is NOTHING else "put"
+        self._client._call_default(self, kind, args)
+
+    def __iter__(self):
+        return iter(self._client.enumerate(self))
+
+    def __len__(self):
+        return self._client.invoke(self, "Count")
+
+    def __bool__(self):
+        return True
+
+    def invoke(self, member, *args, kind=None):
+        """Calls a member by name (or dispatch id, given as an int); the result only."""
+        return self._client.invoke(self, member, *args, kind=kind)
+
+    def invoke_full(self, member, *args, kind=None):
+        """Calls a member; returns (result, final arguments) for by-reference results."""
+        return self._client.invoke_full(self, member, *args, kind=kind)
+
+    def __repr__(self):
+        return f"<Proxy {self._class or 'object'} #{self._handle}>"
+
+    def __del__(self):
+        client = self._client
+        if client is not None:
+            client._forget(self)
+
+
+class _BoundMember:
+    """A member of a proxy: call it to call the method (or read an indexed property);
+    ``get``, ``put`` and ``full`` are explicit."""
+
+    def __init__(self, proxy, name, kind):
+        self._proxy = proxy
+        self._name = name
+        self._kind = kind
+
+    def __call__(self, *args):
+        kind = "get" if self._kind == "indexed" else None
+        return self._proxy._client.invoke(self._proxy, self._name, *args, kind=kind)
+
+    def get(self, *args):
+        return self._proxy._client.invoke(self._proxy, self._name, *args, kind="get")
+
+    def put(self, *args):
+        return self._proxy._client.invoke(self._proxy, self._name, *args, kind="put")
+
+    def full(self, *args):
+        return self._proxy._client.invoke_full(self._proxy, self._name, *args)
+
+    def __repr__(self):
+        return f"<member {self._name} of {self._proxy!r}>"
+
+
+class Client:
+    """A running ``ludmoxd`` and the host's end of the conversation.
+
+    ``path`` defaults to ``$LUDMOX_LUDMOXD``, then ``ludmoxd`` on the PATH. ``stderr`` is
+    passed to ``subprocess.Popen`` (the server writes diagnostics there).
+    """
+
+    def __init__(self, path=None, args=(), env=None, stderr=None):
+        path = path or os.environ.get("LUDMOX_LUDMOXD") or "ludmoxd"
+        self._process = subprocess.Popen(
+            [path, *args], stdin=subprocess.PIPE, stdout=subprocess.PIPE, stderr=stderr,
+            env=env)
+        self._next_id = 1
+        self._answers = {}
+        self._proxies = weakref.WeakValueDictionary()
+        self._releases = []
+        self._handlers = {}
+        self._typelib = None
+        self._classes = {}
+        self._closed = False
+
+    # Lifetime -----------------------------------------------------------------------
+
+    def __enter__(self):
+        return self
+
+    def __exit__(self, *exc):
+        self.close()
+
+    def close(self, timeout=30):
+        """Closes the server's input (it then releases every object) and waits for it to
+        end; returns its exit code."""
+        if not self._closed:
+            self._closed = True
+            try:
+                self._process.stdin.close()
+            except OSError:
+                pass
+        code = self._process.wait(timeout=timeout)
+        self._process.stdout.close()
+        return code
+
+    def shutdown(self):
+        """Asks the server to end; it releases every object."""
+        self._request("shutdown", {})
+        return self.close()
+
+    @property
+    def process(self):
+        return self._process
+
+    # The protocol -------------------------------------------------------------------
+
+    def typelib(self):
+        """The component's type library (cached)."""
+        if self._typelib is None:
+            self._typelib = self._request("typelib", {})
+            self._classes = {}
+            for entry in self._typelib["classes"]:
+                members = {}
+                for member in entry["members"]:
+                    members.setdefault(member["name"].lower(), []).append(member)
+                self._classes[entry["name"]] = {"entry": entry, "members": members}
+        return self._typelib
+
+    def create(self, class_name):
+        """Creates an object of a creatable class (or Scripting.Dictionary)."""
+        result = self._request("create", {"class": class_name})
+        return self._proxy(result["object"], class_name)
+
+    def dictionary(self, mapping=None, compare_mode=None):
+        """A new Scripting.Dictionary, filled from a mapping."""
+        proxy = self.create("Scripting.Dictionary")
+        if compare_mode is not None:
+            proxy.CompareMode = compare_mode
+        for key, value in (mapping or {}).items():
+            proxy.Add(key, value)
+        return proxy
+
+    def invoke(self, obj, member, *args, kind=None):
+        """Calls a member of an object by name or dispatch id; returns its result."""
+        return self.invoke_full(obj, member, *args, kind=kind)[0]
+
+    def invoke_full(self, obj, member, *args, kind=None):
+        """Calls a member; returns (result, final values of the arguments passed)."""
+        params = {"object": obj.handle}
+        if isinstance(member, int):
+            params["dispid"] = member
+        else:
+            params["member"] = member
+        if kind is not None:
+            params["kind"] = kind
+        params["args"] = [self._encode(arg) for arg in args]
+        result = self._request("invoke", params)
+        declared = self._declared_member(obj.class_name, member, kind)
+        value = self._decode(result["value"], declared and declared.get("returns"))
+        params_declared = (declared or {}).get("params", [])
+        final = [
+            self._decode(arg, params_declared[i]["type"] if i < len(params_declared) else None)
+            for i, arg in enumerate(result.get("args", []))
+        ]
+        return value, final
+
+    def enumerate(self, obj):
+        """What iterating the object yields."""
+        return [self._decode(item) for item in self._request("enumerate", {"object": obj.handle})["items"]]
+
+    def on(self, obj, event_name, handler):
+        """Calls ``handler(event)`` when ``obj`` raises ``event_name`` (connects the object's
+        events on the first registration)."""
+        key = (obj.handle, event_name.lower())
+        first = not any(handle == obj.handle for handle, _ in self._handlers)
+        self._handlers[key] = (handler, obj)
+        if first:
+            self._request("connect", {"object": obj.handle})
+
+    def disconnect(self, obj):
+        """Stops the object's events and forgets its handlers."""
+        self._handlers = {k: v for k, v in self._handlers.items() if k[0] != obj.handle}
+        self._request("disconnect", {"object": obj.handle})
+
+    def release(self, obj):
+        """Gives the object's references back now; the proxy is dead afterwards."""
+        refs = obj._refs
+        object.__setattr__(obj, "_refs", 0)
+        self._proxies.pop(obj.handle, None)
+        for _ in range(refs):
+            self._request("release", {"object": obj.handle})
+
+    def send_raw(self, line):
+        """Writes one raw line to the server (for tests of malformed input)."""
+        self._process.stdin.write(line if isinstance(line, bytes) else line.encode("utf-8"))
+        self._process.stdin.write(b"\n")
+        self._process.stdin.flush()
+
+    def read_message(self):
+        """Reads one message from the server as it is (for tests)."""
+        line = self._process.stdout.readline()
+        if not line:
+            raise ConnectionError("ludmoxd ended")
+        return json.loads(line)
+
+    # Internals ----------------------------------------------------------------------
+
+    def _send(self, message):
+        text = json.dumps(message, ensure_ascii=True, allow_nan=False, separators=(",", ":"))
+        try:
+            self._process.stdin.write(text.encode("ascii") + b"\n")
+            self._process.stdin.flush()
+        except (BrokenPipeError, ValueError) as error:
+            raise ConnectionError("ludmoxd is not running") from error
+
+    def _flush_releases(self):
+        while self._releases:
+            handle = self._releases.pop()
+            self._send({"jsonrpc": "2.0", "method": "release", "params": {"object": handle}})
+
+    def _request(self, method, params):
+        if self._closed:
+            raise ConnectionError("the client is closed")
+        self._flush_releases()
+        request_id = self._next_id
+        self._next_id += 1
+        self._send({"jsonrpc": "2.0", "id": request_id, "method": method, "params": params})
+        while request_id not in self._answers:
+            message = self.read_message()
+            if "method" in message:
+                self._serve(message)
+            elif message.get("id") is not None:
+                self._answers[message["id"]] = message
+        answer = self._answers.pop(request_id)
+        if "error" in answer:
+            raise self._error(answer["error"])
+        return answer["result"]
+
+    @staticmethod
+    def _error(error):
+        data = error.get("data")
+        data = data if isinstance(data, dict) else {}
+        return ComError(
+            data.get("number", error.get("code")), data.get("source", ""),
+            data.get("description", error.get("message", "")), error.get("code"), data)
+
+    def _serve(self, message):
+        """Answers a request of the server: an event."""
+        request_id = message.get("id")
+        if message.get("method") != "event":
+            if request_id is not None:
+                self._send({"jsonrpc": "2.0", "id": request_id, "error": {
+                    "code": METHOD_NOT_FOUND, "message": "Method not found"}})
+            return
+        params = message.get("params", {})
+        handle = params.get("object")
+        name = params.get("name", "")
+        entry = self._handlers.get((handle, name.lower()))
+        source = entry[1] if entry else self._proxies.get(handle)
+        declared = self._declared_event(source.class_name if source else None, name)
+        types = [p["type"] for p in declared["params"]] if declared else []
+        args = [self._decode(arg, types[i] if i < len(types) else None)
+                for i, arg in enumerate(params.get("args", []))]
+        if entry is None:
+            answer = {"args": params.get("args", [])}
+        else:
+            event = Event(source, name, params.get("dispid"), args)
+            try:
+                returned = entry[0](event)
+                final = list(returned) if isinstance(returned, (list, tuple)) else event.args
+                answer = {"args": [self._encode(arg) for arg in final]}
+            except Exception as error:  # the handler's failure goes back as an error answer
+                if request_id is not None:
+                    self._send({"jsonrpc": "2.0", "id": request_id, "error": {
+                        "code": COMPONENT_ERROR, "message": str(error)}})
+                return
+        if request_id is not None:
+            self._send({"jsonrpc": "2.0", "id": request_id, "result": answer})
+
+    def _forget(self, proxy):
+        if proxy._refs and not self._closed:
+            self._releases.extend([proxy._handle] * proxy._refs)
+
+    def _proxy(self, handle, class_name=None):
+        if handle == 0:
+            return NOTHING
+        proxy = self._proxies.get(handle)
+        if proxy is not None:
+            object.__setattr__(proxy, "_refs", proxy._refs + 1)
+            if proxy._class is None and class_name:
+                object.__setattr__(proxy, "_class", class_name)
+            return proxy
+        proxy = Proxy(self, handle, class_name)
+        self._proxies[handle] = proxy
+        return proxy
+
+    def _known_class(self, type_name):
+        if not type_name:
+            return None
+        self.typelib()
+        if type_name in self._classes or type_name in _PLATFORM_CLASSES:
+            return type_name
+        return None
+
+    def _class_members(self, class_name):
+        self.typelib()
+        if class_name in self._classes:
+            return {name: [m["kind"] if m["kind"] != "get" or not _required(m) else "indexed"
+                           for m in members]
+                    for name, members in self._classes[class_name]["members"].items()}
+        if class_name in _PLATFORM_CLASSES:
+            return {name: [kind] for name, kind in _PLATFORM_CLASSES[class_name].items()}
+        return None
+
+    def _member_kind(self, class_name, name):
+        """"method", "property" (read at once), "indexed" (a property read with
+        arguments) or None when the host cannot tell (it is then called)."""
+        members = self._class_members(class_name)
+        kinds = None
+        if members is not None:
+            kinds = members.get(name.lower())
+            if kinds is None:
+                raise AttributeError(f"{class_name} has no member {name}")
+        else:
+            # Unknown class: a name that means the same everywhere in the library decides.
+            found = set()
+            for other in self._classes:
+                kinds_here = self._class_members(other).get(name.lower())
+                if kinds_here:
+                    found.add(_kind_of(kinds_here))
+            if len(found) == 1:
+                return found.pop()
+            return None
+        return _kind_of(kinds)
+
+    def _declared_member(self, class_name, member, kind):
+        if not class_name or isinstance(member, int):
+            return None
+        self.typelib()
+        entry = self._classes.get(class_name)
+        if entry is None:
+            return None
+        candidates = entry["members"].get(member.lower(), [])
+        for wanted in ([kind] if kind else ["method", "get"]):
+            for candidate in candidates:
+                if candidate["kind"] == wanted:
+                    return candidate
+        return candidates[0] if candidates else None
+
+    def _declared_event(self, class_name, name):
+        if not class_name:
+            return None
+        self.typelib()
+        entry = self._classes.get(class_name)
+        events = entry and entry["entry"].get("events")
+        for event in (events or {}).get("members", []):
+            if event["name"].lower() == name.lower():
+                return event
+        return None
+
+    def _call_default(self, proxy, kind, args):
+        return self.invoke(proxy, 0, *args, kind=kind)
+
+    def _encode(self, value):
+        if value is None:
+            return None
+        if value is EMPTY:
+            return {"$empty": True}
+        if value is NOTHING:
+            return {"$object": 0}
+        if value is MISSING:
+            return {"$missing": True}
+        if isinstance(value, Proxy):
+            return {"$object": value.handle}
+        if isinstance(value, ErrorValue):
+            return {"$error": value.code}
+        if isinstance(value, (bool, int, float, str)):
+            return value
+        if isinstance(value, decimal.Decimal):
+            return {"$currency": format(value, "f")}
+        if isinstance(value, datetime.datetime):
+            if value.tzinfo is not None:
+                value = value.astimezone().replace(tzinfo=None)
+            spec = "milliseconds" if value.microsecond else "seconds"
+            return {"$date": value.isoformat(timespec=spec)}
+        if isinstance(value, datetime.date):
+            return {"$date": value.isoformat()}
+        if isinstance(value, Array2D):
+            return {"$array": [[self._encode(v) for v in row] for row in value],
+                    "bounds": [list(pair) for pair in value.bounds]}
+        if isinstance(value, (list, tuple)):
+            return {"$array": [self._encode(v) for v in value],
+                    "lbound": getattr(value, "lbound", 0)}
+        if isinstance(value, (bytes, bytearray)):
+            return {"$array": list(value), "lbound": 0}
+        raise TypeError(f"cannot pass {type(value).__name__} to the component")
+
+    def _decode(self, value, type_name=None):
+        if isinstance(value, list):
+            return [self._decode(v) for v in value]
+        if not isinstance(value, dict):
+            return value
+        if "$empty" in value:
+            return EMPTY
+        if "$missing" in value:
+            return MISSING
+        if "$object" in value:
+            return self._proxy(value["$object"], self._known_class(type_name))
+        if "$currency" in value:
+            return decimal.Decimal(value["$currency"])
+        if "$date" in value:
+            return datetime.datetime.fromisoformat(value["$date"])
+        if "$error" in value:
+            return ErrorValue(value["$error"])
+        if "$array" in value:
+            if "bounds" in value:
+                return Array2D([[self._decode(v) for v in row] for row in value["$array"]],
+                               value["bounds"])
+            items = [self._decode(v) for v in value["$array"]]
+            lbound = value.get("lbound", 0)
+            return items if lbound == 0 else Array(items, lbound)
+        return value
+
+
+def _required(member):
+    return any(not p["optional"] for p in member["params"])
+
+
+def _kind_of(kinds):
+    if "method" in kinds:
+        return "method"
+    if "indexed" in kinds:
+        return "indexed"
+    if "get" in kinds:
+        return "property"
+    return "method"
