@@ -155,12 +155,13 @@ class Event:
         return f"Event({self.name!r}, {self.args!r})"
 
 
-# Classes the component hands out that its type library does not list, by member kind.
+# Classes the component hands out that its type library does not list: member kinds as
+# the type library gives them ("indexed": a property read with arguments).
 _PLATFORM_CLASSES = {
     "Scripting.Dictionary": {
-        "item": "indexed", "add": "method", "count": "property", "exists": "method",
+        "item": "indexed", "add": "method", "count": "get", "exists": "method",
         "items": "method", "keys": "method", "remove": "method", "removeall": "method",
-        "comparemode": "property",
+        "comparemode": "get",
     },
     "Collection": {
         "item": "method", "add": "method", "count": "method", "remove": "method",
@@ -218,7 +219,12 @@ class Proxy:
         return iter(self._client.enumerate(self))
 
     def __len__(self):
-        return self._client.invoke(self, "Count")
+        try:
+            return self._client.invoke(self, "Count")
+        except ComError as error:
+            if error.code == INVALID_PARAMS:
+                raise TypeError(f"{self!r} has no Count") from error
+            raise
 
     def __bool__(self):
         return True
@@ -362,6 +368,8 @@ class Client:
         result = self._request("invoke", params)
         declared = self._declared_member(obj.class_name, member, kind)
         value = self._decode(result["value"], declared and declared.get("returns"))
+        if declared is not None and declared.get("returns") is None and value is EMPTY:
+            value = None  # a procedure
         params_declared = (declared or {}).get("params", [])
         final = [
             self._decode(arg, params_declared[i]["type"] if i < len(params_declared) else None)
