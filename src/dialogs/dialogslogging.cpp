@@ -1,0 +1,5 @@
+#include "dialogslogging_p.h"
+
+namespace dialogs {
+Q_LOGGING_CATEGORY(lcDialogs, "ludmox.dialogs")
+}

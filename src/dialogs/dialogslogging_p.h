@@ -1,0 +1,7 @@
+#pragma once
+
+#include <QLoggingCategory>
+
+namespace dialogs {
+Q_DECLARE_LOGGING_CATEGORY(lcDialogs)
+}
