@@ -4,6 +4,7 @@
 #include "core/text.h"
 #include "core/variant.h"
 #include "dialogs/dateentrysettings.h"
+#include "dialogs/frminputbox.h"
 #include "dialogs/inputboxparams.h"
 #include "dialogs/uistrings.h"
 #include "engine/moxengine115.h"
@@ -224,10 +225,17 @@ void writeBack(runtime::ParameterField& parameter, const dialogs::InputBoxParams
     parameter.addCurrentValue(converted);
 }
 
-// PENDING(frmInputBox): shows the dialog once the input box form exists.
-bool showInputBox(dialogs::InputBoxParams&, int32_t, const QString&, int32_t)
+/// The input dialog, owned by the host's window, shown modally.
+bool showInputBox(const std::shared_ptr<dialogs::InputBoxParams>& params, int32_t buttons,
+    const QString& title, int32_t owner)
 {
-    throw core::ComError::basic(429);
+    dialogs::frmInputBox form;
+    form.HelpContextID = params->HelpId;
+    form.ShowBox(params, buttons, title);
+    if (owner != 0)
+        SetOwnerWindow(platform::WindowHandles::handle(&form), owner);
+    form.exec();
+    return form.Result;
 }
 
 } // namespace
@@ -301,8 +309,8 @@ bool ShowInputDialog(
         }
         const InputBoxPresenter& presenter = installedPresenter();
         if (presenter)
-            return presenter(*Params, Buttons, Title, owner);
-        return showInputBox(*Params, Buttons, Title, owner);
+            return presenter(Params, Buttons, Title, owner);
+        return showInputBox(Params, Buttons, Title, owner);
     } catch (const core::ComError&) {
         return false;
     }

@@ -42,8 +42,8 @@ int32_t SetOwnerWindow(int32_t Hwnd, int32_t OwnerHwnd);
 
 /// What shows the prepared dialog: the model (without "MDIHandle"), the buttons value, the
 /// title and the owner window's handle; true when the user confirmed.
-using InputBoxPresenter = std::function<bool(
-    dialogs::InputBoxParams& params, int32_t buttons, const QString& title, int32_t owner)>;
+using InputBoxPresenter = std::function<bool(const std::shared_ptr<dialogs::InputBoxParams>& params,
+    int32_t buttons, const QString& title, int32_t owner)>;
 
 /// Replaces what shows the dialog (tests answer it without a window); null restores the
 /// input dialog. Returns the previous presenter.

@@ -148,15 +148,15 @@ protected:
     {
         engine::ReleaseApplication();
         platform::MessageBoxService::setActive(messages);
-        m_previousPresenter
-            = reports::SetInputBoxPresenter([this](dialogs::InputBoxParams& params, int32_t buttons,
-                                                const QString& title, int32_t owner) {
-                  ++dialog.shown;
-                  dialog.buttons = buttons;
-                  dialog.title = title;
-                  dialog.owner = owner;
-                  return dialog.answer(params);
-              });
+        m_previousPresenter = reports::SetInputBoxPresenter(
+            [this](const std::shared_ptr<dialogs::InputBoxParams>& params, int32_t buttons,
+                const QString& title, int32_t owner) {
+                ++dialog.shown;
+                dialog.buttons = buttons;
+                dialog.title = title;
+                dialog.owner = owner;
+                return dialog.answer(*params);
+            });
         moxEngine->SetLogonInfo(engine::ecstMSSQL, u"srv"_s, u"Shop"_s, u"sa"_s, u"Secr3t"_s);
         collection->SetEngine(moxEngine);
     }
