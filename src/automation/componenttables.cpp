@@ -16,6 +16,9 @@ void registerComponentTables(Registry& registry)
     registerCollection(registry);
     registerEnumerator(registry);
     registerRuntimeReport(registry);
+
+    registerInputBoxParams(registry);
+    registerInputBoxParamsItem(registry);
 }
 
 } // namespace automation

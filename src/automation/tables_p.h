@@ -22,6 +22,10 @@ void registerCollection(Registry& registry);
 void registerEnumerator(Registry& registry);
 void registerRuntimeReport(Registry& registry);
 
+// The component's own classes that hosts reach by member name only.
+void registerInputBoxParams(Registry& registry);
+void registerInputBoxParamsItem(Registry& registry);
+
 /// Adds every table above to the registry, the type library's classes in library order.
 void registerComponentTables(Registry& registry);
 
