@@ -35,6 +35,7 @@ TEST_F(ReportLifecycle, FirstUseOpensLogsOnLocatesAndAppliesInOrder)
     report->SetParams(dictionary({ { u"Customer"_s, u"ACME"_s } }));
     report->TopNGroups(3);
     report->SetSelection(u"Orders"_s, core::VariantArray::fromList({ int32_t(3) }));
+    EXPECT_TRUE(fake.calls().isEmpty()) << "requests before the first use open nothing";
 
     ASSERT_EQ(report->C_Report(), file);
 
@@ -457,25 +458,6 @@ TEST_F(ReportLifecycle, ReloadKeepingParametersPutsTheFirstValuesBack)
     EXPECT_TRUE(report->ReloadKeepingParameters(true));
     EXPECT_TRUE(customer->state.currentValues.empty());
     EXPECT_FALSE(report->ReloadKeepingParameters(false)) << "nothing left to keep";
-}
-
-TEST_F(ReportLifecycle, PublicFlagsStartAsDocumented)
-{
-    const auto report = open();
-    EXPECT_FALSE(report->IgnoreNoDataCheck());
-    EXPECT_FALSE(report->UnloadRequest());
-    EXPECT_FALSE(report->PreviewActive());
-    EXPECT_TRUE(report->DefaultPrinter().isEmpty());
-    EXPECT_EQ(report->DefaultPaperSize(), 0);
-    EXPECT_FALSE(report->UseOldCrystal());
-    EXPECT_FALSE(report->ValidMail());
-    EXPECT_FALSE(report->SendMailError());
-    EXPECT_FALSE(report->SaveAsPDFError());
-    EXPECT_FALSE(report->SaveAsXLSError());
-    EXPECT_EQ(report->TopNGroups(), -1);
-    EXPECT_EQ(report->MoxEvents(), report->MoxEvents());
-    EXPECT_EQ(report->GetReport(), nullptr);
-    EXPECT_TRUE(fake.calls().isEmpty()) << "creating a report opens nothing";
 }
 
 } // namespace
