@@ -391,7 +391,8 @@ void frmInputBox::fillField(Field& f)
         default:
             if (item.Password) {
                 auto* style = new PasswordStyle(engine::gXPStyle ? QChar(0x25CF) : QChar(u'*'));
-                style->setParent(f.edit);
+                // Owned by the dialog, so that it outlives the text box that uses it.
+                style->setParent(this);
                 f.edit->setStyle(style);
                 f.edit->setEchoMode(QLineEdit::Password);
             }

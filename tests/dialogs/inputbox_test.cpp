@@ -1,3 +1,4 @@
+#include "dialogs/dateentry.h"
 #include "dialogs/inputboxlayout.h"
 #include "widgettest.h"
 
@@ -108,6 +109,9 @@ TEST_F(InputBoxTest, PlusAndMinusStepAWhollySelectedDate)
     QTest::keyClick(edit, Qt::Key_Minus, Qt::KeypadModifier);
     QTest::keyClick(edit, '-');
     EXPECT_EQ(edit->text(), u"30.12.2020"_s);
+    QTest::keyClick(edit, Qt::Key_D, Qt::ControlModifier);
+    EXPECT_EQ(edit->text(), formatDate(QDate::currentDate(), u"dd.mm.yyyy"_s));
+    EXPECT_EQ(edit->selectedText(), edit->text());
 }
 
 TEST_F(InputBoxTest, DayOffsetsAreAppliedWhenTheFieldIsLeft)
