@@ -9,21 +9,6 @@ namespace automation {
 using engine::MoxEngine115;
 using reports::MoxReports115;
 
-namespace {
-// The engine library sits below the reports library and cannot create collections; the
-// public member is composed here from the collection's own operations.
-std::shared_ptr<MoxReports115> GetReports(MoxEngine115& engine)
-{
-    try {
-        auto reports = std::make_shared<MoxReports115>();
-        reports->SetEngine(std::static_pointer_cast<MoxEngine115>(engine.shared_from_this()));
-        return reports;
-    } catch (const std::exception&) {
-        return nullptr;
-    }
-}
-} // namespace
-
 void registerMoxEngine115(Registry& registry)
 {
     ClassBuilder<MoxEngine115> c(QStringLiteral("MoxEngine115"), QStringLiteral("_MoxEngine115"));
@@ -39,7 +24,7 @@ void registerMoxEngine115(Registry& registry)
         { param(QStringLiteral("ServerType"), QStringLiteral("MoxServerTypes")),
             param(QStringLiteral("ServerName")), param(QStringLiteral("BaseName")),
             param(QStringLiteral("UserID")), param(QStringLiteral("Info")) });
-    c.method(QStringLiteral("GetReports"), 0x6003000a, &GetReports, {},
+    c.method(QStringLiteral("GetReports"), 0x6003000a, &MoxEngine115::GetReports, {},
         { .returns = QStringLiteral("MoxReports115") });
     c.method(QStringLiteral("PrinterSetup"), 0x6003000b, &MoxEngine115::PrinterSetup,
         { optionalParam(QStringLiteral("hWndParent"), int32_t(0)),
