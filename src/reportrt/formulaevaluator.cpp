@@ -255,8 +255,14 @@ Value call(const FormulaExpr& e, const Value* record, const QDateTime& now)
                 fail(e, QStringLiteral("the number of decimals must be -15 to 15"));
         }
         const double factor = std::pow(10.0, static_cast<double>(places));
-        // Half away from zero, as report authors expect from Round.
-        const double rounded = std::round(args[0].numeric() * factor) / factor;
+        // Half away from zero, as report authors expect from Round, and for the
+        // decimal value written: 2.345 is 2.34499999... in binary but rounds up.
+        const double scaled = args[0].numeric() * factor;
+        const double whole = std::trunc(scaled);
+        double rounded = std::round(scaled);
+        if (std::fabs(std::fabs(scaled - whole) - 0.5) <= 1e-12 * std::max(1.0, std::fabs(scaled)))
+            rounded = whole + (scaled < 0 ? -1.0 : 1.0);
+        rounded /= factor;
         if (args[0].type() == ValueType::Currency)
             return checkedCurrency(e, rounded);
         return checkedNumber(e, rounded);

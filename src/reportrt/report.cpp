@@ -401,11 +401,10 @@ std::shared_ptr<Report::Plan> Report::plan(bool bindParameters) const
         inputs << parameter.name + u'=' + values.join(u'|');
     }
     if (first) {
-        try {
-            const ConnectionSpec spec = ProviderMap::fromProperties(first->connection);
-            inputs << spec.describe() << spec.userName;
-        } catch (const core::ComError&) {
-            inputs << QStringLiteral("unreachable");
+        for (const ConnectionProperty& property : first->connection) {
+            if (property.name.compare(u"Password", Qt::CaseInsensitive) != 0)
+                inputs << property.name + u'=' + property.text + QString::number(property.number)
+                        + (property.boolean ? u'1' : u'0');
         }
     }
     for (const QString& column : p->columnReferences)
