@@ -226,9 +226,6 @@ void frmInputBox::ShowBox(
     m_buttons = Buttons;
     if (!m_params)
         m_params = std::make_shared<InputBoxParams>();
-    m_labelAutoSize = m_params->LabelAutoSize;
-    m_labelLeftAlign = m_params->LabelLeftAlign;
-    m_validateOnOK = m_params->ValidateOnOK;
 
     const std::vector<InputBoxParams::ItemPtr> items = m_params->NewEnum();
     for (size_t i = 0; i < items.size(); ++i)

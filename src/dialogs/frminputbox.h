@@ -87,9 +87,6 @@ private:
     QPushButton* cmdOK;
     QPushButton* cmdCancel;
     FieldLeaveHook m_fieldLeaveHook;
-    bool m_labelAutoSize = false;
-    bool m_labelLeftAlign = false;
-    bool m_validateOnOK = false; // carried from the list; nothing depends on it
     bool m_browseDialogOpen = false;
     bool m_changed = false;
     bool m_activated = false;
