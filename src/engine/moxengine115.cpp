@@ -248,8 +248,11 @@ void MoxEngine115::Logoff()
         if (!mLoggedOn)
             return;
         mLoggedOn = false;
-        GuardedCall([this] {
-            GetApplication()->logOffServer(oleDbDriver, mServerName, mBaseName, mUserID, mInfo);
+        // Taken outside the guarded call: a crash unwinds it without running destructors,
+        // and the application must not be left referenced.
+        const auto application = GetApplication();
+        GuardedCall([&] {
+            application->logOffServer(oleDbDriver, mServerName, mBaseName, mUserID, mInfo);
         });
     });
     step([] { RemoveExceptionFilter(); });
@@ -320,6 +323,10 @@ bool MoxEngine115::SetLocation(const std::shared_ptr<runtime::Report>& report,
     mConnectionFailed = false;
     bool relocated = false;
     bool oleFound = false;
+    if (!report) {
+        mLastError = core::ComError::basic(core::ErrorNumber::ObjectVariableNotSet).lastErrorText();
+        return false;
+    }
 
     // Resetting first keeps no parent from an earlier engine when this one has none.
     ignoringErrors([&] { report->setDialogParentWindow(0); });

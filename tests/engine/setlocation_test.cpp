@@ -293,6 +293,13 @@ TEST_F(SetLocation, FailingSubreportStopsTheWalkButKeepsFoundObjects)
     EXPECT_EQ(blob, nullptr);
 }
 
+TEST_F(SetLocation, NoReportFailsWithoutCrashing)
+{
+    auto engine = loggedOnEngine();
+    EXPECT_FALSE(engine->SetLocation(nullptr, ole, picture, blob));
+    EXPECT_TRUE(engine->LastError().startsWith(u"91, "_s)) << engine->LastError().toStdString();
+}
+
 TEST_F(SetLocation, FindsFirstOleObjectLastPictureObjectAndLastBlobAcrossSubreports)
 {
     auto engine = loggedOnEngine();

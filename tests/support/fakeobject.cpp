@@ -63,13 +63,15 @@ QString FakeObject::arg(const core::Variant& value)
 
 void FakeObject::record(const QString& method, QStringList arguments) const
 {
-    if (const auto shared = m_script.lock())
+    // No strong reference is held while the call's rules run (see Script::record); the
+    // FakeRuntime that owns the script outlives every call made while it is alive.
+    if (Script* shared = m_script.lock().get())
         shared->record(Call { m_kind, label(), method, std::move(arguments), false, false });
 }
 
 void FakeObject::recordQuery(const QString& method, QStringList arguments) const
 {
-    if (const auto shared = m_script.lock())
+    if (Script* shared = m_script.lock().get())
         shared->record(Call { m_kind, label(), method, std::move(arguments), true, false });
 }
 

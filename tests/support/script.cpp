@@ -2,6 +2,7 @@
 
 #include <QRegularExpression>
 #include <stdexcept>
+#include <utility>
 
 namespace fakeruntime {
 
@@ -18,20 +19,25 @@ void Script::record(Call call)
     m_log.push_back(std::move(call));
     const size_t index = m_log.size() - 1;
     // Count every matching rule first so that one throwing action does not leave later
-    // rules a call behind.
-    std::vector<std::function<void()>> actions;
+    // rules a call behind. Nothing here owns memory while the actions run: a test may
+    // crash inside an action on purpose, and the crash guard unwinds without destructors.
     for (Rule& rule : m_rules) {
+        rule.firesNow = false;
         if (!matches(rule, m_log[index]))
             continue;
         ++rule.seen;
-        if (rule.occurrence == 0 || rule.seen == rule.occurrence)
-            actions.push_back(rule.action);
+        rule.firesNow = rule.occurrence == 0 || rule.seen == rule.occurrence;
     }
     try {
-        for (const auto& action : actions)
-            action();
+        // By index: an action may add rules.
+        for (size_t i = 0; i < m_rules.size(); ++i) {
+            if (std::exchange(m_rules[i].firesNow, false))
+                m_rules[i].action();
+        }
     } catch (...) {
         m_log[index].raised = true;
+        for (Rule& rule : m_rules)
+            rule.firesNow = false;
         throw;
     }
 }

@@ -57,6 +57,7 @@ private:
         QString method; // "*": any method
         int occurrence = 0;
         int seen = 0;
+        bool firesNow = false;
         std::function<void()> action;
     };
     static bool matches(const Rule& rule, const Call& call);
