@@ -5,6 +5,7 @@
 #include <QPageSize>
 #include <QPrinterInfo>
 #include <QStandardPaths>
+#include <algorithm>
 
 using namespace Qt::StringLiterals;
 
@@ -63,6 +64,32 @@ QList<PrinterInfo> Printers::installed()
     for (const QPrinterInfo& info : system)
         printers.append(fromSystem(info));
     printers.append(virtualPdfPrinter());
+    printers.append(configuredPdfPrinters());
+    return printers;
+}
+
+QList<PrinterInfo> Printers::configuredPdfPrinters()
+{
+    // Sites configure further PDF printers (an archive folder, a scanning inbox) as
+    // "Device Name=folder" entries separated by ";". Malformed entries and entries that
+    // would shadow another printer's name are skipped.
+    QList<PrinterInfo> printers;
+    const QString configured = qEnvironmentVariable("LUDMOX_PDF_PRINTERS");
+    for (const QString& entry : configured.split(u';', Qt::SkipEmptyParts)) {
+        const qsizetype separator = entry.indexOf(u'=');
+        if (separator <= 0)
+            continue;
+        const QString name = entry.left(separator).trimmed();
+        const QString folder = entry.mid(separator + 1).trimmed();
+        if (name.isEmpty() || folder.isEmpty()
+            || name.compare(virtualPdfDeviceName(), Qt::CaseInsensitive) == 0)
+            continue;
+        const bool taken = std::any_of(printers.cbegin(), printers.cend(),
+            [&](const PrinterInfo& p) { return p.deviceName() == name; });
+        if (!taken)
+            printers.append(PrinterInfo(
+                name, virtualPdfDriverName(), QDir::cleanPath(QDir(folder).absolutePath())));
+    }
     return printers;
 }
 

@@ -23,7 +23,11 @@ public:
     static QString virtualPdfFolder();
     static PrinterInfo virtualPdfPrinter();
 
-    /// Every installed printer, the system's first, the PDF printer last.
+    /// Further PDF printers configured in $LUDMOX_PDF_PRINTERS ("Name=folder;Name2=folder2");
+    /// each writes to its own folder like the built-in one.
+    static QList<PrinterInfo> configuredPdfPrinters();
+    /// Every installed printer: the system's, the PDF printer, then the configured PDF
+    /// printers.
     static QList<PrinterInfo> installed();
     /// The first installed printer whose device name is exactly deviceName.
     static std::optional<PrinterInfo> find(const QString& deviceName);

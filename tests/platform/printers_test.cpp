@@ -100,6 +100,26 @@ TEST_F(PdfPrinterTest, IsAlwaysInstalledUnderItsOwnNames)
     }
 }
 
+TEST_F(PdfPrinterTest, ConfiguredPdfPrintersFollowTheBuiltInOneAndPrintToTheirOwnFolders)
+{
+    const QString archive = folder() + u"/archive"_s;
+    qputenv("LUDMOX_PDF_PRINTERS",
+        QFile::encodeName(
+            u"Archive="_s + archive + u";broken;=nameless;lud mox pdf=/x;Archive=/y"_s));
+    const QList<platform::PrinterInfo> printers = Printers::installed();
+    qunsetenv("LUDMOX_PDF_PRINTERS");
+
+    // Malformed entries and names that would shadow another printer are skipped.
+    ASSERT_GE(printers.size(), 2);
+    EXPECT_EQ(printers.at(printers.size() - 2).deviceName(), u"LUD Mox PDF"_s);
+    const platform::PrinterInfo configured = printers.constLast();
+    EXPECT_EQ(configured, platform::PrinterInfo(u"Archive"_s, u"ludmox-pdf"_s, archive));
+
+    auto device = PrinterDevice::create(configured, {}, u"Copy"_s);
+    paint(*device, u"Archived"_s);
+    EXPECT_EQ(QFileInfo(device->finish()).absolutePath(), archive);
+}
+
 TEST_F(PdfPrinterTest, PrintsACompletePdfUnderANewName)
 {
     auto device = PrinterDevice::create(Printers::virtualPdfPrinter(), {}, u"Invoice 42"_s);
