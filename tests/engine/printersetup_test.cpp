@@ -4,6 +4,8 @@
 #include "platform/printers.h"
 #include "platform/tempfolder.h"
 
+#include <QFile>
+#include <QTemporaryDir>
 #include <cstring>
 
 namespace enginetest {
@@ -214,6 +216,43 @@ TEST_F(PrinterSetup, DeviceNameSelectsAnInstalledPrinterWithoutRegardToCase)
     // The printer already current is not selected again, which would reset its settings.
     engine->SetProperties(u"DeviceName"_s, core::Variant(u"lud mox pdf"_s));
     EXPECT_EQ(current.settings().duplex(), 3);
+}
+
+// A second printer, configured as another PDF printer of the platform.
+class TwoPrinters : public PrinterSetup {
+protected:
+    void SetUp() override
+    {
+        qputenv("LUDMOX_PDF_PRINTERS", QFile::encodeName(u"Archive="_s + m_folder.path()));
+        PrinterSetup::SetUp();
+    }
+    void TearDown() override
+    {
+        PrinterSetup::TearDown();
+        qunsetenv("LUDMOX_PDF_PRINTERS");
+    }
+
+    QTemporaryDir m_folder;
+};
+
+TEST_F(TwoPrinters, ConfirmedDialogThatChoseAnotherPrinterMakesItCurrent)
+{
+    printDialog->enqueue(confirmed(*platform::Printers::find(u"Archive"_s)));
+
+    ASSERT_TRUE(engine->PrinterSetup(0, 0, 0));
+
+    EXPECT_EQ(engine->Properties(u"Printer.DeviceName"_s), core::Variant(u"Archive"_s));
+    EXPECT_EQ(engine->Properties(u"printer.port"_s), core::Variant(m_folder.path()));
+    EXPECT_EQ(engine::DevNames().deviceName, u"Archive"_s);
+}
+
+TEST_F(TwoPrinters, DeviceNameSwitchesToTheFirstMatchWithoutRegardToCase)
+{
+    engine->SetProperties(u"DeviceName"_s, core::Variant(u"ARCHIVE"_s));
+    EXPECT_EQ(platform::CurrentPrinter::instance().deviceName(), u"Archive"_s);
+
+    engine->SetProperties(u"DeviceName"_s, core::Variant(u"Nowhere"_s));
+    EXPECT_EQ(platform::CurrentPrinter::instance().deviceName(), u"Archive"_s);
 }
 
 TEST_F(PrinterSetup, PropertiesReadPrinterWindowsAndRecords)
