@@ -3,6 +3,7 @@
 
 #include "automation/registry.h"
 #include "automation/server.h"
+#include "dialogcanceller.h"
 
 #include <QApplication>
 #include <csignal>
@@ -34,6 +35,10 @@ int main(int argc, char* argv[])
     QApplication::setQuitOnLastWindowClosed(false);
 
     automation::Server server(STDIN_FILENO, protocolOutput, automation::Registry::instance());
+    // A host that goes away while a dialog of the component is open cannot answer it: the
+    // dialogs are cancelled so that the calls waiting on them return and the server ends.
+    DialogCanceller canceller;
+    server.setInputEndedHandler([&canceller] { canceller.cancelAll(); });
     const int exitCode = server.run();
     ::close(protocolOutput);
     return exitCode;

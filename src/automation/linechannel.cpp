@@ -34,6 +34,7 @@ void LineChannel::readAvailable()
     if (count <= 0) {
         m_inputEnded = true;
         m_notifier->setEnabled(false);
+        Q_EMIT inputEnded();
         return;
     }
     m_partial.append(buffer, count);

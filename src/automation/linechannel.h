@@ -41,6 +41,11 @@ public:
     bool isStopped() const { return m_stopped; }
     bool atEnd() const { return m_inputEnded && m_lines.empty() && m_partial.isEmpty(); }
 
+Q_SIGNALS:
+    /// The input has closed. Emitted once, possibly from inside a modal loop that runs while
+    /// the server waits (a dialog): such a loop must end for the server to end.
+    void inputEnded();
+
 private:
     void readAvailable();
     void splitLines();

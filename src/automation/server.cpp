@@ -534,4 +534,9 @@ size_t Server::heldObjects() const
     return d->handles.size();
 }
 
+void Server::setInputEndedHandler(std::function<void()> handler)
+{
+    QObject::connect(&d->channel, &LineChannel::inputEnded, std::move(handler));
+}
+
 } // namespace automation

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <functional>
 #include <memory>
 
 namespace automation {
@@ -27,6 +28,10 @@ public:
 
     /// Objects the host holds right now.
     size_t heldObjects() const;
+
+    /// Runs when the input closes, whatever the server is doing at the time; the server
+    /// application uses it to end modal dialogs nobody can answer any more.
+    void setInputEndedHandler(std::function<void()> handler);
 
 private:
     class Private;

@@ -6,6 +6,7 @@ Run by CTest with LUDMOX_LUDMOXD set to the server and PYTHONPATH to python/.
 import datetime
 import decimal
 import gc
+import json
 import subprocess
 import unittest
 
@@ -342,6 +343,22 @@ class ServerLifetimeTest(unittest.TestCase):
         reports.Item("/r.rpt")
         self.assertEqual(mox.close(), 0)
         self.assertIn("released 3 objects", diagnostics_of(mox))
+
+    def test_dialogs_left_open_by_a_departed_host_are_cancelled(self):
+        # The print dialog is modal and nobody answers it offscreen; once the host closes
+        # the server's input the dialog is cancelled and the call returns False. The
+        # second call opens its dialog only after the input has ended.
+        mox = start()
+        engine = mox.create("MoxEngine115")
+        for request_id in (100, 101):
+            mox.send_raw(json.dumps({"jsonrpc": "2.0", "id": request_id, "method": "invoke",
+                                     "params": {"object": engine.handle,
+                                                "member": "PrinterSetup"}}))
+        mox.process.stdin.close()
+        answers = [mox.read_message(), mox.read_message()]
+        self.assertEqual([a["result"]["value"] for a in answers], [False, False])
+        self.assertEqual(mox.process.wait(timeout=120), 0)
+        mox.process.stdout.close()
 
     def test_proxies_give_their_references_back(self):
         mox = start(diagnostics=True)
