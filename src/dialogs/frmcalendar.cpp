@@ -28,6 +28,9 @@ QString dateText(const QDate& date)
     return core::text::format(QDateTime(date, QTime(12, 0)), core::text::shortDatePattern());
 }
 
+// Room for the 225-twip month-step buttons 105 twips below the month view's top.
+constexpr int MonthTitleHeight = 435;
+
 QDate withDayKept(int year, int month, int day)
 {
     const QDate first(year, month, 1);
@@ -94,6 +97,8 @@ frmCalendar::frmCalendar(QWidget* parent)
         column->setSpacing(0);
         auto* title = new QLabel(MonthView);
         title->setAlignment(Qt::AlignCenter);
+        // The month steps sit in this row, as they sit in the month view's own header.
+        title->setFixedHeight(qRound(MonthTitleHeight / platform::twipsPerPixelY(this)));
         title->setObjectName(QStringLiteral("MonthTitle_%1").arg(i));
         auto* calendar = new QCalendarWidget(MonthView);
         calendar->setObjectName(QStringLiteral("Month_%1").arg(i));
