@@ -369,3 +369,20 @@ TEST(Parameters, CurrentValuesConvertReplaceOrJoinAndRespectTheList)
 }
 
 } // namespace
+
+namespace {
+
+TEST(OpeningFiles, FuzzCorpusSampleUsesEveryPartOfTheFormat)
+{
+    // The fuzzers start from this file, so it must be valid for them to reach deep code.
+    const QString path = qEnvironmentVariable("LUDMOX_TEST_DATA") + u"/fuzz/document/full.rpt";
+    const auto report = Report::open(path);
+    EXPECT_TRUE(report->hasSavedData());
+    EXPECT_EQ(report->topNGroupCount(QStringLiteral("GH1")), 5);
+    const auto objects = report->sections()[0]->reportObjects();
+    EXPECT_FALSE(objects[1]->picture().isNull());
+    const auto sub = objects[2]->openSubreport();
+    EXPECT_EQ(sub->databaseTables()[0]->name(), u"Customers");
+}
+
+} // namespace
