@@ -384,11 +384,9 @@ class Client:
     def on(self, obj, event_name, handler):
         """Calls ``handler(event)`` when ``obj`` raises ``event_name`` (connects the object's
         events on the first registration)."""
-        key = (obj.handle, event_name.lower())
-        first = not any(handle == obj.handle for handle, _ in self._handlers)
-        self._handlers[key] = (handler, obj)
-        if first:
+        if not any(handle == obj.handle for handle, _ in self._handlers):
             self._request("connect", {"object": obj.handle})
+        self._handlers[(obj.handle, event_name.lower())] = (handler, obj)
 
     def disconnect(self, obj):
         """Stops the object's events and forgets its handlers."""
@@ -547,13 +545,16 @@ class Client:
         return _kind_of(kinds)
 
     def _declared_member(self, class_name, member, kind):
-        if not class_name or isinstance(member, int):
+        if not class_name:
             return None
         self.typelib()
         entry = self._classes.get(class_name)
         if entry is None:
             return None
-        candidates = entry["members"].get(member.lower(), [])
+        if isinstance(member, int):
+            candidates = [m for m in entry["entry"]["members"] if m["dispid"] == member]
+        else:
+            candidates = entry["members"].get(member.lower(), [])
         for wanted in ([kind] if kind else ["method", "get"]):
             for candidate in candidates:
                 if candidate["kind"] == wanted:

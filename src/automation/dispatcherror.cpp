@@ -34,8 +34,9 @@ DispatchError DispatchError::paramNotOptional(const QString& member, int argumen
 
 DispatchError DispatchError::conversion(const core::ComError& cause, int argumentIndex)
 {
-    const bool overflow = cause.number() == core::ErrorNumber::Overflow;
-    return DispatchError(overflow ? DispatchNumber::Overflow : DispatchNumber::TypeMismatch,
+    // Every value that does not convert is a type mismatch to the caller, an out-of-range
+    // number included; the description keeps what the conversion said ("Overflow").
+    return DispatchError(DispatchNumber::TypeMismatch,
         QStringLiteral("%1: argument %2").arg(cause.description()).arg(argumentIndex + 1),
         argumentIndex);
 }

@@ -11,7 +11,6 @@ namespace automation {
 namespace DispatchNumber {
 constexpr int32_t MemberNotFound = static_cast<int32_t>(0x80020003);
 constexpr int32_t TypeMismatch = static_cast<int32_t>(0x80020005);
-constexpr int32_t Overflow = static_cast<int32_t>(0x8002000A);
 constexpr int32_t BadParamCount = static_cast<int32_t>(0x8002000E);
 constexpr int32_t ParamNotOptional = static_cast<int32_t>(0x8002000F);
 constexpr int32_t ClassNotRegistered = static_cast<int32_t>(0x80040154);
@@ -29,8 +28,8 @@ public:
     static DispatchError memberNotFound(const QString& className, const QString& member);
     static DispatchError badParamCount(const QString& member, int given, int declared);
     static DispatchError paramNotOptional(const QString& member, int argumentIndex);
-    /// An argument that failed to convert: Overflow for a value out of the type's range,
-    /// Type mismatch for every other failure.
+    /// An argument that failed to convert (out of range, Null, no number...): Type
+    /// mismatch, with the conversion's own description.
     static DispatchError conversion(const core::ComError& cause, int argumentIndex);
     static DispatchError typeMismatch(int argumentIndex, const QString& detail);
 
