@@ -328,6 +328,9 @@ bool MoxReport115::LoadReport(bool Refresh, bool& NoDialog)
             ApplySqlSelection();
             d->TopNGroups = ApplyTopNGroups(d->TopNGroups);
         }
+        // A host may close the report from an event raised while it loads.
+        if (!d->mReport)
+            return fail();
         d->Loaded = true;
         d->Loading = false;
         return true;
@@ -340,9 +343,10 @@ bool MoxReport115::LoadReport(bool Refresh, bool& NoDialog)
 void MoxReport115::raiseErrorOccured()
 {
     const QString lastError = owningEngine()->LastError();
-    // Without an event object no host can be listening.
-    if (!lastError.isEmpty() && d->Events)
-        d->Events->ErrorOccured(lastError);
+    // Without an event object no host can be listening. It is held here: a handler may
+    // close the report, which releases it.
+    if (const auto events = d->Events; events && !lastError.isEmpty())
+        events->ErrorOccured(lastError);
 }
 
 bool MoxReport115::openReportFile()

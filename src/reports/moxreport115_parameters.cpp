@@ -102,8 +102,9 @@ void MoxReport115::SetParameters(bool& Cancelled, bool NoDialog)
             QString prompt = parameter->prompt();
             if (!IsLUDPrompt(prompt))
                 continue;
-            if (!d->ParamsApplied && d->Events)
-                d->Events->QueryParameters(prompt, answer);
+            // Held here: a handler may close the report, which releases its event object.
+            if (const auto events = d->Events; events && !d->ParamsApplied)
+                events->QueryParameters(prompt, answer);
             applyAnswer(*parameter, answer);
         } else {
             applyHostValue(*parameter, value);

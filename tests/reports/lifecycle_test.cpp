@@ -237,6 +237,20 @@ TEST_F(ReportLifecycle, ALoadStartedFromAnEventDuringLoadingReturnsAtOnce)
     EXPECT_EQ(callsOf(u"Application.openReport"_s).size(), 1);
 }
 
+TEST_F(ReportLifecycle, AReportClosedByTheHostWhileLoadingIsNotLoaded)
+{
+    auto file = addOrdersReport();
+    addParameter(*file, Param(u"Region"_s).prompt(u"LUD#Regions"_s).satisfied());
+    const auto report = open();
+    recordEvents(*report, [&](const QString&, std::span<core::Variant>) { report->CloseReport(); });
+
+    EXPECT_FALSE(load(*report));
+    EXPECT_TRUE(report->UnloadRequest());
+    EXPECT_EQ(report->GetReport(), nullptr);
+    // The next use starts afresh.
+    EXPECT_EQ(report->C_Report(), file);
+}
+
 TEST_F(ReportLifecycle, ARepeatedSingleRecordSelectionLogsOnAgainOnTheNextLoad)
 {
     addOrdersReport();
