@@ -4,6 +4,7 @@
 #include "automation/registry.h"
 #include "automation/server.h"
 #include "dialogcanceller.h"
+#include "reportrt/install.h"
 
 #include <QApplication>
 #include <csignal>
@@ -31,6 +32,7 @@ int main(int argc, char* argv[])
     }
 
     QApplication application(argc, argv);
+    reportrt::install();
     QApplication::setApplicationName(QStringLiteral("ludmoxd"));
     QApplication::setQuitOnLastWindowClosed(false);
 

@@ -7,7 +7,10 @@ import datetime
 import decimal
 import gc
 import json
+import os
+import sqlite3
 import subprocess
+import tempfile
 import unittest
 
 from ludmox_client import (
@@ -19,6 +22,7 @@ TYPE_MISMATCH = -2147352571  # 0x80020005
 BAD_PARAM_COUNT = -2147352562  # 0x8002000E
 PARAM_NOT_OPTIONAL = -2147352561  # 0x8002000F
 OBJECT_VARIABLE_NOT_SET = 91
+OPEN_REPORT_FAILED = -2147191159  # 0x80047689
 
 
 def start(diagnostics=False):
@@ -319,6 +323,53 @@ class EventsTest(unittest.TestCase):
         self.mox.on(self.events, "QueryParameters", broken)
         _, args = self.events.invoke_full("QueryParameters", "LUD#X", EMPTY)
         self.assertEqual(args, ["LUD#X", EMPTY])
+
+
+class RuntimeReportTest(unittest.TestCase):
+    """The runtime's own report object, handed out by C_Report, is reached by member name."""
+
+    def setUp(self):
+        folder = tempfile.TemporaryDirectory()
+        self.addCleanup(folder.cleanup)
+        self.database = os.path.join(folder.name, "shop.db")
+        with sqlite3.connect(self.database) as connection:
+            connection.execute("CREATE TABLE Orders (ID INTEGER, Customer TEXT)")
+            connection.executemany("INSERT INTO Orders VALUES (?, ?)", [(1, "A"), (2, "B")])
+        connection.close()
+        self.path = os.path.join(folder.name, "orders.rpt")
+        with open(self.path, "w", encoding="utf-8") as document:
+            json.dump({
+                "format": "ludmox-report", "version": 1,
+                "tables": [{
+                    "name": "Orders",
+                    "connection": [{"name": "Provider", "value": "Microsoft.Jet.OLEDB.4.0"},
+                                   {"name": "Data Source", "value": self.database}],
+                    "fields": [{"name": "ID", "type": "number"},
+                               {"name": "Customer", "type": "string"}]}],
+                "selectionFormula": "{Orders.ID} > 0"}, document)
+        self.mox = start()
+        self.addCleanup(self.mox.close)
+        self.engine = self.mox.create("MoxEngine115")
+        self.engine.SetLogonInfo(1, self.database, "", "", "")
+        # The host keeps the collection: a report reaches its engine through it.
+        self.reports = self.engine.GetReports()
+
+    def test_selection_formula_and_statement_by_name(self):
+        runtime_report = self.reports.Item(self.path).C_Report
+        self.assertIsInstance(runtime_report, Proxy)
+        self.assertEqual(runtime_report.RecordSelectionFormula(), "{Orders.ID} > 0")
+        self.assertIn("FROM Orders", runtime_report.SQLQueryString())
+        runtime_report.RecordSelectionFormula = "{Orders.ID} = 2"
+        self.assertEqual(runtime_report.RecordSelectionFormula(), "{Orders.ID} = 2")
+
+    def test_runtime_errors_reach_the_host(self):
+        report = self.reports.Item(os.path.join(os.path.dirname(self.path), "absent.rpt"))
+        with self.assertRaises(ComError) as caught:
+            report.C_Report
+        error = caught.exception
+        self.assertEqual((error.code, error.number), (-32000, OPEN_REPORT_FAILED))
+        self.assertTrue(error.source)
+        self.assertIn("absent.rpt", error.description)
 
 
 class ServerLifetimeTest(unittest.TestCase):
