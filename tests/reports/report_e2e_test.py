@@ -1,0 +1,141 @@
+"""A host drives a report through ludmoxd and the real report runtime: it sets a selection,
+answers QueryParameters, and reads the resulting selection formula and SQL statement back
+from the runtime's report object (C_Report).
+
+Run by CTest with LUDMOX_LUDMOXD set to the server and PYTHONPATH to python/.
+"""
+
+import json
+import os
+import sqlite3
+import subprocess
+import tempfile
+import unittest
+
+from ludmox_client import Array2D, Client, ComError
+
+ECST_MSJET = 1
+USER_CANCELLED = -2147221351  # 0x80040099
+SUBSCRIPT_OUT_OF_RANGE = 9
+CRLF = "\r\n"
+
+
+def make_database(path):
+    with sqlite3.connect(path) as db:
+        db.execute("CREATE TABLE Orders (ID INTEGER PRIMARY KEY, Status TEXT, Total REAL)")
+        db.executemany("INSERT INTO Orders VALUES (?, ?, ?)",
+                       [(1, "open", 50), (3, "open", 150), (5, "closed", 500)])
+
+
+def report_document(selection_formula):
+    return {
+        "format": "ludmox-report",
+        "version": 1,
+        "tables": [{
+            "name": "Orders",
+            "location": "shop.dbo.Orders",
+            "driver": "crdb_ado.dll",
+            "connection": [
+                {"name": "Provider", "value": "SQLOLEDB"},
+                {"name": "Data Source", "value": "designsrv"},
+                {"name": "Initial Catalog", "value": "shop"},
+            ],
+            "fields": [
+                {"name": "ID", "type": "number"},
+                {"name": "Status", "type": "string"},
+                {"name": "Total", "type": "number"},
+            ],
+        }],
+        "selectionFormula": selection_formula,
+        # Offered values come from the host; the report does not use the parameter, so it
+        # needs no value and no dialog is shown.
+        "parameters": [{"name": "Region", "prompt": "LUD#Regions", "valueType": 12}],
+        "sections": [{
+            "name": "D", "height": 300,
+            "objects": [{"kind": "field", "name": "IDField", "field": "{Orders.ID}",
+                         "width": 1000, "height": 240}],
+        }],
+    }
+
+
+class ReportThroughLudmoxd(unittest.TestCase):
+    def setUp(self):
+        self.folder = tempfile.TemporaryDirectory()
+        self.addCleanup(self.folder.cleanup)
+        self.database = os.path.join(self.folder.name, "shop.db")
+        make_database(self.database)
+        self.mox = Client(stderr=subprocess.DEVNULL)
+        self.addCleanup(self.mox.close)
+        self.engine = self.mox.create("MoxEngine115")
+        self.engine.Init(3, False, 0, 0)
+        # A Jet logon names the database file as the server.
+        self.engine.SetLogonInfo(ECST_MSJET, self.database, "", "admin", "")
+        self.reports = self.engine.GetReports()
+
+    def open_report(self, name, selection_formula):
+        path = os.path.join(self.folder.name, name)
+        with open(path, "w", encoding="utf-8") as file:
+            json.dump(report_document(selection_formula), file)
+        return self.reports.Item(path)
+
+    def test_a_selection_and_the_hosts_answer_reach_the_runtime_report(self):
+        report = self.open_report("orders.rpt", "{Orders.Status} = 'open'")
+        events = report.MoxEvents
+        prompts = []
+
+        def answer(event):
+            prompts.append(event.args[0])
+            event.args[1] = Array2D([["N", "S", "unused"], ["North", "South", ""]])
+
+        self.mox.on(events, "QueryParameters", answer)
+        self.assertTrue(report.SetSelection("Orders", 5))
+
+        # The runtime's own report object, reached by member name as a late-bound host does.
+        runtime_report = report.C_Report
+        self.assertEqual(prompts, ["LUD#Regions"])
+        self.assertFalse(report.UnloadRequest)
+        self.assertEqual(
+            runtime_report.RecordSelectionFormula.get(),
+            CRLF.join(["(//LUD#1", "{Orders.Status} = 'open'", ")//LUD#2", "//LUDSELECTION",
+                       "AND ({Orders.ID}=5)"]))
+
+        # A list of ids goes into the statement, after the runtime's own condition.
+        self.assertTrue(report.SetSelection("Orders", [1, 3]))
+        self.assertEqual(runtime_report.RecordSelectionFormula.get(), "{Orders.Status} = 'open'")
+        statement = runtime_report.SQLQueryString.get()
+        head, where, condition = statement.rpartition(CRLF + "WHERE" + CRLF + "    ")
+        self.assertTrue(where, statement)
+        self.assertTrue(condition.endswith("(Orders.ID IN (1,3))"), statement)
+        self.assertNotIn('"', statement, "Jet statements quote with grave accents")
+
+        # The host is asked once per report; a second run keeps what it answered.
+        self.assertIsNone(report.SetParameters())
+        self.assertEqual(prompts, ["LUD#Regions"])
+
+    def test_an_answer_the_component_cannot_read_reaches_the_host_as_an_error(self):
+        report = self.open_report("orders.rpt", "")
+        # Offered values need two rows (values and descriptions); one row has no second
+        # dimension to read.
+        self.mox.on(report.MoxEvents, "QueryParameters",
+                    lambda event: event.args.__setitem__(1, ["N", "S"]))
+        with self.assertRaises(ComError) as raised:
+            report.C_Report
+        self.assertEqual(raised.exception.number, SUBSCRIPT_OUT_OF_RANGE)
+        self.assertTrue(report.UnloadRequest)
+
+    def test_a_report_without_ole_db_tables_is_refused(self):
+        document = report_document("")
+        document["tables"][0]["driver"] = "crdbxml.dll"
+        path = os.path.join(self.folder.name, "legacy.rpt")
+        with open(path, "w", encoding="utf-8") as file:
+            json.dump(document, file)
+        report = self.reports.Item(path)
+        self.assertFalse(report.CheckOLEDB())
+        with self.assertRaises(ComError) as raised:
+            report.GetParamsCollection()
+        self.assertEqual(raised.exception.number, USER_CANCELLED)
+        self.assertEqual(raised.exception.source, "LUD Crystal Engine")
+
+
+if __name__ == "__main__":
+    unittest.main()
