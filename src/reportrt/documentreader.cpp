@@ -720,7 +720,8 @@ private:
     SectionDefinition section(const JsonNode& n, const ReportDocument& doc, bool nested)
     {
         expectObject(n, QStringLiteral("a section"));
-        expectKeys(n, { u"name", u"height", u"suppressed", u"objects" });
+        expectKeys(n,
+            { u"name", u"height", u"suppressed", u"newPageBefore", u"newPageAfter", u"objects" });
         SectionDefinition s;
         s.name = string(n, u"name", true);
         static const QRegularExpression pattern(
@@ -741,6 +742,8 @@ private:
         }
         s.height = integer(n, u"height", 0, maxTwips, 0);
         s.suppressed = boolean(n, u"suppressed");
+        s.newPageBefore = boolean(n, u"newPageBefore");
+        s.newPageAfter = boolean(n, u"newPageAfter");
         if (const JsonNode* list = optionalArray(n, u"objects", maxObjects)) {
             for (const JsonNode& item : list->items)
                 s.objects.push_back(object(item, doc, nested));
@@ -755,7 +758,8 @@ private:
         expectKeys(n,
             { u"kind", u"name", u"left", u"top", u"width", u"height", u"suppressed", u"font",
                 u"alignment", u"color", u"text", u"field", u"special", u"operation", u"group",
-                u"lineWidth", u"fillColor", u"image", u"subreport", u"links" });
+                u"lineWidth", u"fillColor", u"image", u"subreport", u"links", u"canGrow",
+                u"format" });
         static const std::pair<const char16_t*, ObjectKind> kinds[] = {
             { u"text", ObjectKind::Text },
             { u"field", ObjectKind::Field },
@@ -815,6 +819,10 @@ private:
         only({ u"fillColor" }, { ObjectKind::Box });
         only({ u"image" }, { ObjectKind::Picture });
         only({ u"subreport", u"links" }, { ObjectKind::Subreport });
+        only({ u"canGrow" }, { ObjectKind::Text, ObjectKind::Field });
+        only({ u"format" }, { ObjectKind::Field, ObjectKind::Summary, ObjectKind::Special });
+        o.canGrow = boolean(n, u"canGrow");
+        o.format = string(n, u"format");
 
         switch (o.kind) {
         case ObjectKind::Text:

@@ -198,8 +198,13 @@ QJsonObject documentJson(const ReportDocument& doc, bool nested, bool withSavedD
         QJsonArray objects;
         for (const auto& o : s.objects)
             objects.append(objectJson(o));
-        sections.append(QJsonObject { { u"name"_s, s.name }, { u"height"_s, s.height },
-            { u"suppressed"_s, s.suppressed }, { u"objects"_s, objects } });
+        QJsonObject section { { u"name"_s, s.name }, { u"height"_s, s.height },
+            { u"suppressed"_s, s.suppressed }, { u"objects"_s, objects } };
+        if (s.newPageBefore)
+            section.insert(u"newPageBefore", true);
+        if (s.newPageAfter)
+            section.insert(u"newPageAfter", true);
+        sections.append(section);
     }
     root.insert(u"sections", sections);
     if (!nested && withSavedData && doc.savedData) {
@@ -240,6 +245,10 @@ QJsonObject objectJson(const ObjectDefinition& o)
         { u"color"_s, o.color } };
     if (!o.name.isEmpty())
         json.insert(u"name", o.name);
+    if (o.canGrow)
+        json.insert(u"canGrow", true);
+    if (!o.format.isEmpty())
+        json.insert(u"format", o.format);
     switch (o.kind) {
     case Kind::Text:
         json.insert(u"text", o.text);

@@ -10,7 +10,9 @@
 #include "parameterfield.h"
 #include "providermap.h"
 #include "recordreader.h"
+#include "reportexporter.h"
 #include "reportobject.h"
+#include "reportprinter.h"
 #include "runtimeerror.h"
 #include "section.h"
 #include "sqlconnection.h"
@@ -76,6 +78,7 @@ struct Report::Plan {
     std::vector<RecordProcessor::Sort> sorts;
     std::vector<RecordProcessor::Summary> summaries;
     std::map<QString, std::shared_ptr<const FormulaExpr>> references; // lower-case text
+    std::map<const ReportObject*, int> summaryOfObject;
     std::vector<RecordReader::Column> columns;
     std::vector<QString> columnReferences;
     QString sql;
@@ -266,6 +269,17 @@ std::shared_ptr<Report::Plan> Report::plan(bool bindParameters) const
         }
     };
 
+    // What objects show is bound to the parameters' values where they have them; a
+    // parameter without one must not stop the read, it shows nothing.
+    const auto compileShown = [&](const QString& text) {
+        if (bindParameters) {
+            try {
+                return compileReference(*p->compiler, text);
+            } catch (const core::ComError&) { }
+        }
+        return compileReference(*p->checker, text);
+    };
+
     try {
         p->selection
             = p->compiler->compile(m_document.selectionFormula, QStringLiteral("Record Selection"));
@@ -293,11 +307,13 @@ std::shared_ptr<Report::Plan> Report::plan(bool bindParameters) const
     for (const auto& section : m_sections) {
         for (const auto& object : section->objects()) {
             const ObjectDefinition o = object->definition();
-            if (o.kind == ObjectDefinition::Kind::Summary)
+            if (o.kind == ObjectDefinition::Kind::Summary) {
+                p->summaryOfObject[object.get()] = static_cast<int>(p->summaries.size());
                 p->summaries.push_back(
                     { o.operation, compileReference(*p->compiler, o.field), o.group });
+            }
             if (o.kind == ObjectDefinition::Kind::Field || o.kind == ObjectDefinition::Kind::Blob)
-                p->references[o.field.toLower()] = compileReference(*p->checker, o.field);
+                p->references[o.field.toLower()] = compileShown(o.field);
             for (const SubreportLink& link : o.links)
                 p->references[link.mainField.toLower()]
                     = compileReference(*p->checker, link.mainField);
@@ -518,23 +534,37 @@ Value Report::fieldValue(const QString& text) const
     }
 }
 
-void Report::printOut(bool, int16_t, bool, std::optional<runtime::PageRange>)
+const FormulaExpr* Report::compiledReference(const QString& text) const
 {
-    raiseError(Error::RuntimeFailure,
-        QStringLiteral("Printing is not available in this version of the report runtime."));
+    if (!m_lastPlan)
+        return nullptr;
+    const auto found = m_lastPlan->references.find(text.toLower());
+    return found == m_lastPlan->references.end() ? nullptr : found->second.get();
 }
 
-void Report::printerSetup(int32_t)
+int Report::summaryIndex(const ReportObject* object) const
 {
-    raiseError(Error::RuntimeFailure,
-        QStringLiteral(
-            "The printer set-up dialog is not available in this version of the report runtime."));
+    if (!m_lastPlan)
+        return -1;
+    const auto found = m_lastPlan->summaryOfObject.find(object);
+    return found == m_lastPlan->summaryOfObject.end() ? -1 : found->second;
 }
 
-void Report::exportReport(bool)
+void Report::printOut(
+    bool promptUser, int16_t copies, bool collated, std::optional<runtime::PageRange> pages)
 {
-    raiseError(Error::RuntimeFailure,
-        QStringLiteral("Exporting is not available in this version of the report runtime."));
+    ReportPrinter::printOut(*this, promptUser, copies, collated, pages);
+}
+
+void Report::printerSetup(int32_t parentWindowId)
+{
+    ReportPrinter::printerSetup(*this, parentWindowId);
+}
+
+void Report::exportReport(bool promptUser)
+{
+    const auto options = std::static_pointer_cast<ExportOptions>(exportOptions());
+    ReportExporter::exportReport(*this, *options, promptUser);
 }
 
 void Report::selectPrinter(

@@ -111,6 +111,21 @@ public:
     /// The shared_ptr of this report, for its children.
     std::shared_ptr<Report> self() const;
 
+    // For the layout, printing and export (layoutengine.h, reportprinter.h, pdfexporter.h).
+    /// The compiled reference ("{Orders.ID}", "{@Total}") of a field or blob object or a
+    /// subreport link, to evaluate on records() of the last read; null before a read and
+    /// for a reference no object uses.
+    const FormulaExpr* compiledReference(const QString& reference) const;
+    /// Where a summary object's values are in result(): the index into
+    /// RecordProcessor::Result::totals and GroupNode::summaries; -1 when unknown.
+    int summaryIndex(const ReportObject* object) const;
+    const PageSetup& pageSetup() const { return m_document.page; }
+    const StoredPrinter& printer() const { return m_document.printer; }
+    QString title() const { return m_document.summary.title; }
+    int32_t dialogParentWindow() const { return m_dialogParent; }
+    bool isParameterPromptingEnabled() const { return m_parameterPrompting; }
+    void setPrintingStatus(const runtime::PrintingStatus& status) { m_status = status; }
+
 private:
     struct Plan;
     struct Saved {

@@ -150,6 +150,12 @@ struct ObjectDefinition {
     Font font;
     Alignment alignment = Alignment::Left;
     QString color = QStringLiteral("#000000");
+    /// Text, Field: the text wraps at the object's width and the object grows down to hold
+    /// it, and its section instance with it.
+    bool canGrow = false;
+    /// Field, Summary, Special: the display pattern ("#,##0.00", "dd.mm.yyyy"); empty = the
+    /// default for the value's type (docs/report-format.md, "Display formats").
+    QString format;
 
     QString text; // Text
     QString field; // Field, Blob: "{Table.Field}", "{@Formula}" or "{?Parameter}"
@@ -167,6 +173,8 @@ struct SectionDefinition {
     QString name; // "RH", "PH", "GH1", "D", "GF1", "PF", "RF"
     int height = 0; // twips
     bool suppressed = false;
+    bool newPageBefore = false; // each instance starts a new page (but the first on a page)
+    bool newPageAfter = false; // what follows an instance starts a new page
     std::vector<ObjectDefinition> objects;
 };
 

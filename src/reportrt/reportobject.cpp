@@ -136,6 +136,23 @@ core::Variant ReportObject::value() const
     return v.isNull() && !report->result() ? core::Variant() : variantvalue::toVariant(v);
 }
 
+ReportObject::FormatState ReportObject::formatState() const
+{
+    return { m_definition.left, m_definition.top, m_definition.width, m_definition.height,
+        m_picture, m_pictureLoaded, m_pictureChanged };
+}
+
+void ReportObject::restoreFormatState(const FormatState& state)
+{
+    m_definition.left = state.left;
+    m_definition.top = state.top;
+    m_definition.width = state.width;
+    m_definition.height = state.height;
+    m_picture = state.picture;
+    m_pictureLoaded = state.pictureLoaded;
+    m_pictureChanged = state.pictureChanged;
+}
+
 ObjectDefinition ReportObject::definition() const
 {
     ObjectDefinition o = m_definition;

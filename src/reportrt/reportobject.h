@@ -42,6 +42,23 @@ public:
     /// The object as a document stores it (the picture as PNG when it was changed).
     ObjectDefinition definition() const;
     ObjectDefinition::Kind kind() const { return m_definition.kind; }
+    /// The object as it is now, without encoding a changed picture; for the layout.
+    const ObjectDefinition& current() const { return m_definition; }
+
+    /// What a section's format handlers may change on an object. The layout keeps it
+    /// before an instance is formatted and puts it back once the instance is placed, so
+    /// a change made for one record never shows on the next.
+    struct FormatState {
+        int left = 0;
+        int top = 0;
+        int width = 0;
+        int height = 0;
+        QImage picture;
+        bool pictureLoaded = false;
+        bool pictureChanged = false;
+    };
+    FormatState formatState() const;
+    void restoreFormatState(const FormatState& state);
 
 private:
     ObjectDefinition m_definition;

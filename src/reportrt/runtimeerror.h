@@ -17,6 +17,8 @@ constexpr int32_t InvalidDocument = static_cast<int32_t>(0x8004768A);
 constexpr int32_t FormulaError = static_cast<int32_t>(0x8004768B);
 /// Saving the report document failed; the target file is left as it was.
 constexpr int32_t SaveFailed = static_cast<int32_t>(0x8004768C);
+/// An export file could not be written; nothing is left at the target path.
+constexpr int32_t ExportFailed = static_cast<int32_t>(0x8004768D);
 constexpr int32_t RuntimeFailure = core::ErrorNumber::RuntimeFailure;
 constexpr int32_t LogOnFailed = core::ErrorNumber::LogOnFailed;
 constexpr int32_t TableConnectionFailed = core::ErrorNumber::TableConnectionFailed;

@@ -8,6 +8,8 @@ Section::Section(const SectionDefinition& definition, std::weak_ptr<Report> repo
     : m_name(definition.name)
     , m_height(definition.height)
     , m_suppressed(definition.suppressed)
+    , m_newPageBefore(definition.newPageBefore)
+    , m_newPageAfter(definition.newPageAfter)
     , m_report(std::move(report))
 { }
 
@@ -56,6 +58,8 @@ SectionDefinition Section::definition() const
     s.name = m_name;
     s.height = m_height;
     s.suppressed = m_suppressed;
+    s.newPageBefore = m_newPageBefore;
+    s.newPageAfter = m_newPageAfter;
     for (const auto& o : m_objects)
         s.objects.push_back(o->definition());
     return s;

@@ -28,6 +28,11 @@ public:
     void raiseFormat();
 
     std::shared_ptr<Report> report() const { return m_report.lock(); }
+    int height() const { return m_height; } // twips
+    bool isSuppressed() const { return m_suppressed; }
+    bool newPageBefore() const { return m_newPageBefore; }
+    bool newPageAfter() const { return m_newPageAfter; }
+    bool hasFormatHandlers() const { return !m_handlers.empty(); }
     const std::vector<std::shared_ptr<ReportObject>>& objects() const { return m_objects; }
     /// The section as a document stores it, with the objects' current state.
     SectionDefinition definition() const;
@@ -36,6 +41,8 @@ private:
     QString m_name;
     int m_height;
     bool m_suppressed;
+    bool m_newPageBefore;
+    bool m_newPageAfter;
     std::weak_ptr<Report> m_report;
     std::vector<std::shared_ptr<ReportObject>> m_objects;
     std::map<int, FormatHandler> m_handlers;

@@ -1,0 +1,3 @@
+#include "outputlogging_p.h"
+
+Q_LOGGING_CATEGORY(lcOutput, "ludmox.reportrt.output")
