@@ -123,6 +123,36 @@ class ReportThroughLudmoxd(unittest.TestCase):
         self.assertEqual(raised.exception.number, SUBSCRIPT_OUT_OF_RANGE)
         self.assertTrue(report.UnloadRequest)
 
+    def test_the_editing_cycle_and_the_other_members_by_name(self):
+        report = self.open_report("orders.rpt", "{Orders.Status} = 'open'")
+        self.assertTrue(report.SetSelection("Orders", 5))
+        self.assertEqual(report.Status.Progress, 0)
+        self.assertTrue(report.CheckOLEDB())
+        report.C_Report  # loads: saving for editing needs the applied selection
+        scratch = os.path.join(self.folder.name, "scratch.rpt")
+        self.assertTrue(report.SaveReport(scratch))
+
+        ok, (_, original, saved, edited) = report.CheckEditedSelection.full(scratch, "", "", "")
+        self.assertTrue(ok)
+        self.assertEqual(original, "{Orders.Status} = 'open'")
+        self.assertTrue(saved.endswith("AND ({Orders.ID}=5)"))
+        self.assertEqual(edited, "{Orders.Status} = 'open'")
+        self.assertTrue(report.ReplaceEdited(scratch, "{Orders.Total} > 100"))
+        self.assertTrue(report.C_Report.RecordSelectionFormula.get().startswith(
+            "(//LUD#1" + CRLF + "{Orders.Total} > 100" + CRLF))
+
+        self.assertEqual(list(report.GetParamsCollection()), [["Region", "LUD#Regions"]])
+        self.assertEqual(report.GetParamsDictionary().Item("0"), ["Region", "LUD#Regions"])
+        self.assertEqual(report.TopNGroups, -1)
+        report.IgnoreNoDataCheck = True
+        report.UseOldCrystal = True
+        self.assertFalse(report.SaveReport(scratch))
+        self.assertEqual((report.SendMailError, report.SaveAsPDFError, report.SaveAsXLSError),
+                         (False, False, False))
+        self.assertTrue(report.CloseReport(True))
+        self.assertIsNone(report.CloseReport8())
+        self.assertEqual(report.Status.Progress, 0)
+
     def test_a_report_without_ole_db_tables_is_refused(self):
         document = report_document("")
         document["tables"][0]["driver"] = "crdbxml.dll"
