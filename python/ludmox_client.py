@@ -595,8 +595,8 @@ class Client:
         if isinstance(value, datetime.datetime):
             if value.tzinfo is not None:
                 value = value.astimezone().replace(tzinfo=None)
-            spec = "milliseconds" if value.microsecond else "seconds"
-            return {"$date": value.isoformat(timespec=spec)}
+            precision = "milliseconds" if value.microsecond else "seconds"
+            return {"$date": value.isoformat(timespec=precision)}
         if isinstance(value, datetime.date):
             return {"$date": value.isoformat()}
         if isinstance(value, Array2D):
