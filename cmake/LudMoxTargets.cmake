@@ -19,6 +19,13 @@ function(ludmox_configure_target target)
     if(LUDMOX_WERROR)
         target_compile_options(${target} PRIVATE -Werror)
     endif()
+    # Qt's headers dominate the build time on a two-core machine; parse the common ones once
+    # per target.
+    if(LUDMOX_PRECOMPILED_HEADERS)
+        target_precompile_headers(${target} PRIVATE
+            <QtCore/QString> <QtCore/QStringList> <QtCore/QList> <QtCore/QDateTime>
+            <QtCore/QObject> <memory> <vector> <functional>)
+    endif()
 endfunction()
 
 # ludmox_add_library(<name> ALIAS <Alias> SOURCES ... PUBLIC_LIBS ... PRIVATE_LIBS ...)

@@ -7,7 +7,10 @@ bash scripts/setup-debian.sh
 bash scripts/start-services.sh
 
 build_dir=${LUDMOX_BUILD_DIR:-build}
-cmake -S . -B "$build_dir" -G Ninja -DCMAKE_BUILD_TYPE=RelWithDebInfo \
+# The sanitizer build only runs the tests: it is built unoptimised, which compiles fastest.
+build_type=Release
+[ "${LUDMOX_SANITIZE:-OFF}" = ON ] && build_type=Debug
+cmake -S . -B "$build_dir" -G Ninja -DCMAKE_BUILD_TYPE=$build_type \
     -DLUDMOX_WERROR="${LUDMOX_WERROR:-OFF}" -DLUDMOX_SANITIZE="${LUDMOX_SANITIZE:-OFF}"
 cmake --build "$build_dir"
 export ASAN_OPTIONS=${ASAN_OPTIONS:-detect_leaks=1:abort_on_error=1}
