@@ -837,6 +837,7 @@ private:
                 { u"totalPages", SpecialField::TotalPages },
                 { u"printDate", SpecialField::PrintDate },
                 { u"recordNumber", SpecialField::RecordNumber },
+                { u"pageNofM", SpecialField::PageNofM },
             };
             o.special = choice(n, u"special", specials, SpecialField::PageNumber, true);
             break;

@@ -233,7 +233,7 @@ QJsonObject objectJson(const ObjectDefinition& o)
         u"picture", u"blob", u"subreport" };
     static const char16_t* alignments[] = { u"left", u"center", u"right", u"justified" };
     static const char16_t* specials[]
-        = { u"pageNumber", u"totalPages", u"printDate", u"recordNumber" };
+        = { u"pageNumber", u"totalPages", u"printDate", u"recordNumber", u"pageNofM" };
     QJsonObject json { { u"kind"_s, QString::fromUtf16(kinds[static_cast<int>(o.kind)]) },
         { u"left"_s, o.left }, { u"top"_s, o.top }, { u"width"_s, o.width },
         { u"height"_s, o.height }, { u"suppressed"_s, o.suppressed },

@@ -12,6 +12,7 @@
 #include "valueformatter.h"
 
 #include <QPageSize>
+#include <QVarLengthArray>
 #include <algorithm>
 #include <cmath>
 #include <optional>
@@ -233,7 +234,7 @@ private:
     struct Item {
         const ReportObject* object = nullptr;
         QRectF rect; // from the instance's top-left corner
-        std::vector<std::shared_ptr<const ShapedText>> lines;
+        QVarLengthArray<std::shared_ptr<const ShapedText>, 1> lines;
         int font = -1;
         QImage image;
     };
@@ -253,6 +254,7 @@ private:
     QString text(const ReportObject& object);
     Value fieldValue(const ReportObject& object);
     int fontOf(const ReportObject& object);
+    QRgb colorOf(const QString& color);
 
     Layout& m_engine;
     Report& m_report;
@@ -267,6 +269,8 @@ private:
     qsizetype m_next = 0; // the next detail to place, for page headers
     std::unordered_map<const ReportObject*, const FormulaExpr*> m_references;
     std::unordered_map<const ReportObject*, int> m_fonts;
+    QString m_lastColorText;
+    QRgb m_lastColor = 0xff000000;
 };
 
 void Layout::startPage()
@@ -353,6 +357,13 @@ QString Pass::text(const ReportObject& object)
                 d.format.isEmpty() ? QStringLiteral("0") : d.format);
         case SpecialField::PrintDate:
             return m_engine.formatter.format(Value::fromDate(m_engine.printDate.date()), d.format);
+        case SpecialField::PageNofM: {
+            QString shown
+                = d.format.isEmpty() ? QStringLiteral("Page {page} of {pages}") : d.format;
+            shown.replace(QStringLiteral("{page}"), QString::number(m_engine.pageNumber));
+            return shown.replace(QStringLiteral("{pages}"),
+                m_engine.totalPages > 0 ? QString::number(m_engine.totalPages) : QString());
+        }
         case SpecialField::RecordNumber:
             if (m_position < 0)
                 return {};
@@ -382,6 +393,16 @@ Value Pass::fieldValue(const ReportObject& object)
     } catch (const FormulaException& error) {
         raiseError(Error::FormulaError, error.error().describe());
     }
+}
+
+QRgb Pass::colorOf(const QString& color)
+{
+    // Reports use a handful of colours; this runs for every field drawn.
+    if (color == m_lastColorText)
+        return m_lastColor;
+    m_lastColorText = color;
+    m_lastColor = parseColor(color);
+    return m_lastColor;
 }
 
 int Pass::fontOf(const ReportObject& object)
@@ -418,7 +439,8 @@ Pass::Prepared Pass::prepare(const Instance& instance)
                 break;
             item.font = fontOf(*o);
             const bool deferred = d.kind == Kind::Special
-                && (d.special == SpecialField::PageNumber || d.special == SpecialField::TotalPages);
+                && (d.special == SpecialField::PageNumber || d.special == SpecialField::TotalPages
+                    || d.special == SpecialField::PageNofM);
             if (deferred)
                 break;
             const QString shown = text(*o);
@@ -463,9 +485,10 @@ Pass::Prepared Pass::prepare(const Instance& instance)
 void Pass::drawText(const Item& item, double left, double top)
 {
     const ObjectDefinition& d = item.object->current();
-    std::vector<std::shared_ptr<const ShapedText>> lines = item.lines;
+    QVarLengthArray<std::shared_ptr<const ShapedText>, 1> lines = item.lines;
     if (d.kind == Kind::Special
-        && (d.special == SpecialField::PageNumber || d.special == SpecialField::TotalPages)) {
+        && (d.special == SpecialField::PageNumber || d.special == SpecialField::TotalPages
+            || d.special == SpecialField::PageNofM)) {
         const QString shown = text(*item.object);
         if (!shown.isEmpty())
             lines.push_back(m_engine.shaper.shape(shown, item.font));
@@ -473,7 +496,7 @@ void Pass::drawText(const Item& item, double left, double top)
     if (lines.empty() || item.font < 0)
         return;
     const auto& metrics = m_engine.shaper.metrics(item.font);
-    const QRgb color = parseColor(d.color);
+    const QRgb color = colorOf(d.color);
     const double boxLeft = left + item.rect.left();
     const double width = item.rect.width();
     double baseline = top + item.rect.top() + metrics.ascent;
@@ -523,13 +546,13 @@ void Pass::draw(const Prepared& prepared, double top)
             if ((d.width > 0 || d.height > 0) && d.lineWidth > 0
                 && QRectF(from, to).normalized().adjusted(-1, -1, 1, 1).intersects(pageRect))
                 m_engine.page.lines.push_back(
-                    { from, to, static_cast<double>(d.lineWidth), parseColor(d.color) });
+                    { from, to, static_cast<double>(d.lineWidth), colorOf(d.color) });
             break;
         }
         case Kind::Box:
             if (!visible.isEmpty())
                 m_engine.page.boxes.push_back({ rect, static_cast<double>(d.lineWidth),
-                    parseColor(d.color), !d.fillColor.isEmpty(), parseColor(d.fillColor) });
+                    colorOf(d.color), !d.fillColor.isEmpty(), colorOf(d.fillColor) });
             break;
         case Kind::Picture:
         case Kind::Blob: {
@@ -774,7 +797,7 @@ int LayoutEngine::run(const PageSink& sink)
     layout.printDate = m_printDate;
     layout.totalPages = m_totalPages;
     layout.sink = &sink;
-    Pass main(layout, m_report, 0, true);
+    Pass main(layout, m_report, layout.geometry.left, true);
     layout.main = &main;
     try {
         // The report header comes before the page header on the first page.
@@ -793,7 +816,9 @@ bool LayoutEngine::showsTotalPages(Report& report)
     for (const auto& s : report.sections()) {
         for (const auto& o : static_cast<Section*>(s.get())->objects()) {
             const ObjectDefinition& def = o->current();
-            if (def.kind == Kind::Special && def.special == SpecialField::TotalPages)
+            if (def.kind == Kind::Special
+                && (def.special == SpecialField::TotalPages
+                    || def.special == SpecialField::PageNofM))
                 return true;
             if (def.kind == Kind::Subreport
                 && showsTotalPages(*std::static_pointer_cast<Report>(o->openSubreport())))

@@ -128,7 +128,8 @@ struct Font {
 
 enum class Alignment { Left, Center, Right, Justified };
 
-enum class SpecialField { PageNumber, TotalPages, PrintDate, RecordNumber };
+/// PageNofM: "Page 3 of 12"; its format is a template with {page} and {pages}.
+enum class SpecialField { PageNumber, TotalPages, PrintDate, RecordNumber, PageNofM };
 
 struct ReportDocument;
 

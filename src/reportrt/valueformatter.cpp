@@ -3,6 +3,7 @@
 #include <QDate>
 #include <charconv>
 #include <cmath>
+#include <string>
 
 namespace reportrt {
 
@@ -73,16 +74,47 @@ QString ValueFormatter::formatNumber(double value, const NumberPattern& pattern)
 {
     if (!std::isfinite(value))
         return QString::number(value);
+    // The shortest digits that give the value back, rounded half away from zero to the
+    // decimals shown: 2.675 shows as 2.68, as the user reads the number, although the
+    // double is a hair below it.
     char digits[400];
-    const auto result = std::to_chars(digits, digits + sizeof digits, std::fabs(value),
-        std::chars_format::fixed, pattern.decimals);
+    const auto result = std::to_chars(
+        digits, digits + sizeof digits - 1, std::fabs(value), std::chars_format::fixed);
     if (result.ec != std::errc())
         return QString::number(value);
-    const std::string_view text(digits, static_cast<size_t>(result.ptr - digits));
-    const size_t point = text.find('.');
-    const std::string_view whole = text.substr(0, point);
-    const std::string_view fraction
-        = point == std::string_view::npos ? std::string_view() : text.substr(point + 1);
+    std::string text(digits, static_cast<size_t>(result.ptr - digits));
+    size_t point = text.find('.');
+    if (point == std::string::npos) {
+        point = text.size();
+        text += '.';
+    }
+    const size_t keep = point + 1 + static_cast<size_t>(pattern.decimals);
+    if (text.size() < keep)
+        text.append(keep - text.size(), '0');
+    if (text.size() > keep) {
+        const bool up = text[keep] >= '5';
+        text.resize(keep);
+        if (up) {
+            // Carry from the last kept digit leftwards, over the point.
+            size_t i = keep;
+            while (i-- > 0) {
+                if (text[i] == '.')
+                    continue;
+                if (text[i] == '9') {
+                    text[i] = '0';
+                    continue;
+                }
+                ++text[i];
+                break;
+            }
+            if (i == static_cast<size_t>(-1)) {
+                text.insert(text.begin(), '1');
+                ++point;
+            }
+        }
+    }
+    const std::string_view whole(text.data(), point);
+    const std::string_view fraction(text.data() + point + 1, static_cast<size_t>(pattern.decimals));
     const bool isZero = whole.find_first_not_of('0') == std::string_view::npos
         && fraction.find_first_not_of('0') == std::string_view::npos;
 
