@@ -16,17 +16,20 @@ using reports::MoxReport115;
 // 0x6003xxxx, numbered once for the whole interface so that members added later keep
 // their places:
 //
-//   0x00 IgnoreNoDataCheck   0x08 SaveAsPDFError    0x10 CloseReport8          0x18 SetParameters
-//   0x01 UnloadRequest       0x09 SaveAsXLSError    0x11 PrintReport           0x19
-//   GetParamsCollection 0x02 PreviewActive       0x0a TopNGroups        0x12 PrinterSetup 0x1a
-//   GetParamsDictionary 0x03 DefaultPrinter      0x0b MoxEvents         0x13 SetSelection 0x1b
-//   ShowLUDInputBox 0x04 DefaultPaperSize    0x0c Status            0x14 SaveReport            0x1c
-//   SaveAsPDF 0x05 UseOldCrystal       0x0d C_Report          0x15 CheckEditedSelection  0x1d
-//   SaveAsXLS 0x06 ValidMail           0x0e CheckOLEDB        0x16 ReplaceEdited         0x1e
-//   SaveAsHTML 0x07 SendMailError       0x0f CloseReport       0x17 SetParams             0x1f
-//   SendReport
-//                                                                              0x20 OlePath
-//                                                                              0x21 PictureBytes
+// clang-format off
+//   0x00 IgnoreNoDataCheck     0x0b MoxEvents         0x16 ReplaceEdited
+//   0x01 UnloadRequest         0x0c Status            0x17 SetParams
+//   0x02 PreviewActive         0x0d C_Report          0x18 SetParameters
+//   0x03 DefaultPrinter        0x0e CheckOLEDB        0x19 GetParamsCollection
+//   0x04 DefaultPaperSize      0x0f CloseReport       0x1a GetParamsDictionary
+//   0x05 UseOldCrystal         0x10 CloseReport8      0x1b ShowLUDInputBox
+//   0x06 ValidMail             0x11 PrintReport       0x1c SaveAsPDF
+//   0x07 SendMailError         0x12 PrinterSetup      0x1d SaveAsXLS
+//   0x08 SaveAsPDFError        0x13 SetSelection      0x1e SaveAsHTML
+//   0x09 SaveAsXLSError        0x14 SaveReport        0x1f SendReport
+//   0x0a TopNGroups            0x15 CheckEditedSelection  0x20 OlePath
+//                                                     0x21 PictureBytes
+// clang-format on
 void registerMoxReport115(Registry& registry)
 {
     ClassBuilder<MoxReport115> c(QStringLiteral("MoxReport115"), QStringLiteral("_MoxReport115"));
