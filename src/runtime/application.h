@@ -3,7 +3,6 @@
 #include "core/object.h"
 
 #include <QString>
-
 #include <memory>
 
 namespace runtime {

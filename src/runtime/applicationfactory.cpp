@@ -1,7 +1,6 @@
 #include "applicationfactory.h"
 
 #include "application.h"
-
 #include "core/comerror.h"
 
 #include <utility>
@@ -9,12 +8,12 @@
 namespace runtime {
 
 namespace {
-    ApplicationFactory::Function& factory()
-    {
-        static ApplicationFactory::Function instance;
-        return instance;
-    }
+ApplicationFactory::Function& factory()
+{
+    static ApplicationFactory::Function instance;
+    return instance;
 }
+} // namespace
 
 ApplicationFactory::Function ApplicationFactory::install(Function function)
 {

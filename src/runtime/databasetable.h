@@ -4,7 +4,6 @@
 #include "core/variant.h"
 
 #include <QString>
-
 #include <utility>
 #include <vector>
 
@@ -21,8 +20,8 @@ public:
     virtual QString driverName() const = 0;
     virtual QString location() const = 0;
     /// Raises 0x80047E44 when the table cannot be reached at the new location.
-    virtual void setLocation(const QString& location, const QString& subLocation,
-        const QString& connectBufferString)
+    virtual void setLocation(
+        const QString& location, const QString& subLocation, const QString& connectBufferString)
         = 0;
     virtual void deleteConnectionProperties() = 0;
     virtual void addConnectionProperty(const QString& name, const core::Variant& value) = 0;

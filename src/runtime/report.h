@@ -1,11 +1,9 @@
 #pragma once
 
+#include "core/object.h"
 #include "printingstatus.h"
 
-#include "core/object.h"
-
 #include <QString>
-
 #include <functional>
 #include <memory>
 #include <optional>
@@ -61,12 +59,12 @@ public:
     virtual void setNoDataHandler(NoDataHandler handler) = 0;
 
     // Printing
-    virtual void printOut(bool promptUser, int16_t copies, bool collated,
-        std::optional<PageRange> pages)
+    virtual void printOut(
+        bool promptUser, int16_t copies, bool collated, std::optional<PageRange> pages)
         = 0;
     virtual void printerSetup(int32_t parentWindowId) = 0;
-    virtual void selectPrinter(const QString& driverName, const QString& deviceName,
-        const QString& portName)
+    virtual void selectPrinter(
+        const QString& driverName, const QString& deviceName, const QString& portName)
         = 0;
     virtual QString printerDriverName() const = 0;
     virtual QString printerDeviceName() const = 0;

@@ -5,20 +5,35 @@
 namespace runtime {
 
 namespace {
-    [[noreturn]] void notSupported()
-    {
-        throw core::ComError::basic(core::ErrorNumber::ObjectDoesNotSupport);
-    }
+[[noreturn]] void notSupported()
+{
+    throw core::ComError::basic(core::ErrorNumber::ObjectDoesNotSupport);
+}
+} // namespace
+
+std::shared_ptr<Report> ReportObject::openSubreport()
+{
+    notSupported();
 }
 
-std::shared_ptr<Report> ReportObject::openSubreport() { notSupported(); }
+QImage ReportObject::picture() const
+{
+    notSupported();
+}
 
-QImage ReportObject::picture() const { notSupported(); }
+void ReportObject::setPicture(const QImage&)
+{
+    notSupported();
+}
 
-void ReportObject::setPicture(const QImage&) { notSupported(); }
+QString ReportObject::fieldName() const
+{
+    notSupported();
+}
 
-QString ReportObject::fieldName() const { notSupported(); }
-
-core::Variant ReportObject::value() const { notSupported(); }
+core::Variant ReportObject::value() const
+{
+    notSupported();
+}
 
 } // namespace runtime

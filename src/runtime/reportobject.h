@@ -5,7 +5,6 @@
 
 #include <QImage>
 #include <QString>
-
 #include <memory>
 
 namespace runtime {

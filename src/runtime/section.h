@@ -3,7 +3,6 @@
 #include "core/object.h"
 
 #include <QString>
-
 #include <functional>
 #include <memory>
 #include <vector>
