@@ -1,0 +1,21 @@
+#!/usr/bin/env bash
+# The main job: builds LUD Mox, makes the sample database and exports every sample report
+# in examples/reports to PDF with the ludmox host.
+#
+#   bash scripts/run-examples.sh [output folder]     (default: out/examples)
+set -euo pipefail
+cd "$(dirname "$0")/.."
+
+bash scripts/setup-debian.sh
+
+build_dir=${LUDMOX_BUILD_DIR:-build}
+output=${1:-out/examples}
+cmake -S . -B "$build_dir" -G Ninja -DCMAKE_BUILD_TYPE=RelWithDebInfo \
+    -DLUDMOX_WERROR="${LUDMOX_WERROR:-OFF}"
+cmake --build "$build_dir" --target ludmox
+
+mkdir -p "$output"
+python3 examples/make_sample_db.py --output "$output/sample.db"
+"$build_dir/apps/ludmox/ludmox" export --database "$output/sample.db" --output "$output" \
+    --reports examples/reports
+echo "PDF files are in $output"
