@@ -248,6 +248,9 @@ private:
     void place(const Instance& instance, double keepWithNext = 0);
     void placeAt(const Instance& instance, double top);
     Prepared prepare(const Instance& instance);
+    /// The height of every instance of a section without can-grow text or subreports,
+    /// as long as no format handler may change it; nothing for other sections.
+    std::optional<double> fixedHeight(const Section& section);
     void draw(const Prepared& prepared, double top);
     void drawText(const Item& item, double left, double top);
     void layOutSubreports(const Instance& host, const Prepared& prepared, double top);
@@ -269,6 +272,7 @@ private:
     qsizetype m_next = 0; // the next detail to place, for page headers
     std::unordered_map<const ReportObject*, const FormulaExpr*> m_references;
     std::unordered_map<const ReportObject*, int> m_fonts;
+    std::unordered_map<const Section*, std::optional<double>> m_fixedHeights;
     QString m_lastColorText;
     QRgb m_lastColor = 0xff000000;
 };
@@ -413,6 +417,26 @@ int Pass::fontOf(const ReportObject& object)
     const int font = m_engine.shaper.font(object.current().font);
     m_fonts.emplace(&object, font);
     return font;
+}
+
+std::optional<double> Pass::fixedHeight(const Section& section)
+{
+    const auto found = m_fixedHeights.find(&section);
+    if (found != m_fixedHeights.end())
+        return found->second;
+    std::optional<double> height = section.height();
+    for (const auto& o : section.objects()) {
+        const ObjectDefinition& d = o->current();
+        if (d.suppressed)
+            continue;
+        if (d.canGrow || d.kind == Kind::Subreport) {
+            height.reset();
+            break;
+        }
+        height = std::max<double>(*height, d.top + d.height);
+    }
+    m_fixedHeights.emplace(&section, height);
+    return height;
 }
 
 Pass::Prepared Pass::prepare(const Instance& instance)
@@ -585,7 +609,10 @@ void Pass::place(const Instance& instance, double keepWithNext)
         guard.emplace(section);
         section.raiseFormat();
     }
-    const Prepared prepared = prepare(instance);
+    // Counting pages, a section whose height cannot change needs no preparing.
+    const std::optional<double> fixed
+        = m_engine.drawing() || guard ? std::nullopt : fixedHeight(section);
+    const Prepared prepared = fixed ? Prepared { *fixed, {}, {} } : prepare(instance);
     if (prepared.height > 0 || !prepared.subreports.empty()) {
         const double body = m_engine.bodyBottom - m_engine.geometry.top;
         const double needed

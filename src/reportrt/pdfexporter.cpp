@@ -1,5 +1,6 @@
 #include "pdfexporter.h"
 
+#include "allocatortuning_p.h"
 #include "fonttable.h"
 #include "layoutengine.h"
 #include "pagerenderer.h"
@@ -160,6 +161,7 @@ int PdfExporter::exportTo(Report& report, const QString& path)
     if (!report.result())
         report.readRecords();
 
+    tuneAllocatorForPdf();
     FontTable fonts;
     TextShaper shaper(fonts);
     const QDateTime printDate = QDateTime::currentDateTime();

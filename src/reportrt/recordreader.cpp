@@ -4,6 +4,7 @@
 #include "runtimeerror.h"
 #include "valuecodec.h"
 
+#include <QSet>
 #include <QSqlError>
 #include <QSqlQuery>
 #include <QSqlRecord>
@@ -200,12 +201,27 @@ RecordReader::Result RecordReader::read(const Request& request)
             source[static_cast<size_t>(i)] = i;
         }
     }
+    // Text columns of a report repeat (a status, a city, a name per group): each distinct
+    // text is kept once and shared by the records that hold it, which saves most of the
+    // memory of large reads. A column with too many distinct texts stops sharing.
+    constexpr qsizetype sharedTextLimit = 4096;
+    std::vector<QSet<QString>> sharedTexts(static_cast<size_t>(columnCount));
     qsizetype index = 0;
     while (query.next()) {
         Value* record = result.records.append();
         for (int i = 0; i < columnCount; ++i) {
             const QVariant v = query.value(source[static_cast<size_t>(i)]);
             auto converted = convert(v, request.columns[static_cast<size_t>(i)].type);
+            if (converted && converted->type() == ValueType::String) {
+                QSet<QString>& shared = sharedTexts[static_cast<size_t>(i)];
+                if (shared.size() < sharedTextLimit) {
+                    const auto found = shared.constFind(converted->text());
+                    if (found != shared.constEnd())
+                        *converted = Value::string(*found);
+                    else
+                        shared.insert(converted->text());
+                }
+            }
             if (!converted)
                 serverError(
                     QStringLiteral("the value \"%1\" of %2 in record %3 is not a %4 value")

@@ -1,5 +1,6 @@
 #include "reportprinter.h"
 
+#include "allocatortuning_p.h"
 #include "core/comerror.h"
 #include "fonttable.h"
 #include "layoutengine.h"
@@ -158,6 +159,7 @@ void ReportPrinter::printOut(Report& report, bool promptUser, int16_t copies, bo
         settings.setCopies(1);
     }
 
+    tuneAllocatorForPdf();
     status.progress = progressInProgress;
     report.setPrintingStatus(status);
     const auto device = platform::PrinterDevice::create(printer, settings, documentName(report));

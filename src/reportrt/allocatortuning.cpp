@@ -1,0 +1,23 @@
+#include "allocatortuning_p.h"
+
+#include <mutex>
+
+#if defined(__GLIBC__)
+#include <malloc.h>
+#endif
+
+namespace reportrt {
+
+void tuneAllocatorForPdf()
+{
+#if defined(__GLIBC__)
+    static std::once_flag once;
+    std::call_once(once, [] {
+        constexpr int mapThreshold = 32 * 1024 * 1024;
+        mallopt(M_MMAP_THRESHOLD, mapThreshold);
+        mallopt(M_TRIM_THRESHOLD, 2 * mapThreshold);
+    });
+#endif
+}
+
+} // namespace reportrt
