@@ -821,6 +821,17 @@ int LayoutEngine::run(const PageSink& sink)
     if (!m_report.result())
         m_report.readRecords();
     Layout layout(m_report, m_shaper);
+    const PageGeometry& g = layout.geometry;
+    if (g.left + g.right >= g.width || g.top + g.bottom >= g.height)
+        raiseError(Error::RuntimeFailure,
+            QStringLiteral("The margins (left %1, right %2, top %3, bottom %4 twips) leave no "
+                           "room on the paper (%5 x %6 twips).")
+                .arg(g.left)
+                .arg(g.right)
+                .arg(g.top)
+                .arg(g.bottom)
+                .arg(qRound(g.width))
+                .arg(qRound(g.height)));
     layout.printDate = m_printDate;
     layout.totalPages = m_totalPages;
     layout.sink = &sink;

@@ -525,6 +525,44 @@ TEST(FormatEvents, AbsurdSizesAndBadPicturesAreSkippedNotFatal)
     EXPECT_EQ(firstItems(pages), (QStringList { u"Item 1"_s, u"Item 2"_s, u"Item 3"_s }));
 }
 
+TEST(Pictures, AnEmbeddedFileThatIsNoPictureIsSkipped)
+{
+    QTemporaryDir dir;
+    QJsonObject document = pictureReport();
+    QJsonArray sections = document.value(u"sections"_s).toArray();
+    QJsonObject detail = sections[1].toObject();
+    QJsonArray objects = detail.value(u"objects"_s).toArray();
+    QJsonObject broken = objects.last().toObject();
+    broken.insert(u"name"_s, u"Broken"_s);
+    broken.insert(u"image"_s, QString::fromLatin1(QByteArray("GIF89a, or so it says").toBase64()));
+    objects.append(broken);
+    detail.insert(u"objects"_s, objects);
+    sections.replace(1, detail);
+    document.insert(u"sections"_s, sections);
+    auto report = itemsReportFile(dir, 2, document);
+    EXPECT_TRUE(objectNamed(*report, u"D"_s, u"Broken"_s)->picture().isNull());
+    const auto pages = layOut(*report);
+    ASSERT_EQ(pages.size(), 1u);
+    EXPECT_EQ(pages[0].pictures.size(), 2u) << "only the good picture, once per record";
+}
+
+TEST(Margins, ThatLeaveNoRoomAreAnError)
+{
+    QTemporaryDir dir;
+    QJsonObject document = itemsReport(pageBands(nameDetail()));
+    document.insert(u"page"_s,
+        QJsonObject { { u"paperSize"_s, 9 },
+            { u"margins"_s, QJsonObject { { u"left"_s, 6000 }, { u"right"_s, 6000 } } } });
+    auto report = itemsReportFile(dir, 2, document);
+    try {
+        layOut(*report);
+        FAIL() << "laid out";
+    } catch (const core::ComError& error) {
+        EXPECT_EQ(error.number(), Error::RuntimeFailure);
+        EXPECT_TRUE(error.description().contains(u"margins"_s));
+    }
+}
+
 TEST(Blobs, PicturesComeFromTheFieldAndNonPicturesAreSkipped)
 {
     QTemporaryDir dir;
