@@ -120,12 +120,13 @@ void ReportPrinter::printOut(Report& report, bool promptUser, int16_t copies, bo
     FontTable fonts;
     TextShaper shaper(fonts);
     const QDateTime printDate = QDateTime::currentDateTime();
-    int totalPages = 0;
-    if (promptUser || LayoutEngine::showsTotalPages(report)) {
+    const bool showsTotal = LayoutEngine::showsTotalPages(report);
+    const auto countPages = [&] {
         LayoutEngine counter(report, shaper);
         counter.setPrintDate(printDate);
-        totalPages = counter.run({});
-    }
+        return counter.run({});
+    };
+    int totalPages = promptUser || showsTotal ? countPages() : 0;
 
     platform::PrinterInfo printer = printerFor(report);
     platform::PrintSettings settings = settingsFor(report);
@@ -155,14 +156,20 @@ void ReportPrinter::printOut(Report& report, bool promptUser, int16_t copies, bo
         if (choice.range == platform::PrintDialogService::PageRange::Pages)
             pages = runtime::PageRange { static_cast<int16_t>(choice.fromPage),
                 static_cast<int16_t>(choice.toPage) };
+        const PageSetup before = report.pageSetup();
         keepChoice(report, printer, settings);
         settings.setCopies(1);
+        // Other paper gives other pages.
+        const PageSetup& after = report.pageSetup();
+        if (showsTotal
+            && (after.paperSize != before.paperSize || after.orientation != before.orientation))
+            totalPages = countPages();
     }
 
     tuneAllocatorForPdf();
+    const auto device = platform::PrinterDevice::create(printer, settings, documentName(report));
     status.progress = progressInProgress;
     report.setPrintingStatus(status);
-    const auto device = platform::PrinterDevice::create(printer, settings, documentName(report));
     device->setFullPage(true);
     QPainter painter;
     PageRenderer renderer(fonts);

@@ -202,9 +202,9 @@ TEST_F(Printing, ThePromptShowsThePagesAndPrintsWhatTheUserChose)
 
     const QString file = printedFile();
     ASSERT_FALSE(file.isEmpty());
-    // A5 landscape halves the page; the report is laid out again on it, so page 1 and 2
-    // are other pages than on A4, numbered out of more.
+    // A5 landscape (8390 twips high) holds 20 of the 120 details a page: 6 pages.
     EXPECT_EQ(printedPages(file), (std::vector<int> { 1, 1, 2, 2 }));
+    EXPECT_TRUE(pdfText(file, 1).contains(u"Page 1 of 6"_s)) << pdfText(file, 1).toStdString();
     EXPECT_NEAR(pdfPageSize(file).width(), 595.3, 1);
     // The choice stays with the report.
     EXPECT_EQ(report->paperOrientation(), 2);
