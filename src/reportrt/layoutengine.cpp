@@ -207,8 +207,8 @@ struct Layout {
 /// instance (without page header and footer, which belong to the main report).
 class Pass {
 public:
-    Pass(Layout& engine, Report& report, double x, bool isMain)
-        : m_engine(engine)
+    Pass(Layout& layout, Report& report, double x, bool isMain)
+        : m_layout(layout)
         , m_report(report)
         , m_x(x)
         , m_isMain(isMain)
@@ -259,7 +259,7 @@ private:
     int fontOf(const ReportObject& object);
     QRgb colorOf(const QString& color);
 
-    Layout& m_engine;
+    Layout& m_layout;
     Report& m_report;
     double m_x; // left edge, twips
     bool m_isMain;
@@ -335,43 +335,43 @@ QString Pass::text(const ReportObject& object)
     case Kind::Text:
         return d.text;
     case Kind::Field:
-        return m_engine.formatter.format(fieldValue(object), d.format);
+        return m_layout.formatter.format(fieldValue(object), d.format);
     case Kind::Summary: {
         const int index = m_report.summaryIndex(&object);
         if (!m_result || index < 0)
             return {};
         const auto s = static_cast<size_t>(index);
         if (d.group <= 0)
-            return m_engine.formatter.format(m_result->totals[s], d.format);
+            return m_layout.formatter.format(m_result->totals[s], d.format);
         const auto level = static_cast<size_t>(d.group - 1);
         if (level >= m_groupAt.size() || m_groupAt[level] < 0)
             return {};
         const auto& node = m_result->groups[static_cast<size_t>(m_groupAt[level])];
-        return m_engine.formatter.format(node.summaries[s], d.format);
+        return m_layout.formatter.format(node.summaries[s], d.format);
     }
     case Kind::Special:
         switch (d.special) {
         case SpecialField::PageNumber:
-            return m_engine.formatter.format(Value::number(m_engine.pageNumber),
+            return m_layout.formatter.format(Value::number(m_layout.pageNumber),
                 d.format.isEmpty() ? QStringLiteral("0") : d.format);
         case SpecialField::TotalPages:
-            if (m_engine.totalPages <= 0)
+            if (m_layout.totalPages <= 0)
                 return {};
-            return m_engine.formatter.format(Value::number(m_engine.totalPages),
+            return m_layout.formatter.format(Value::number(m_layout.totalPages),
                 d.format.isEmpty() ? QStringLiteral("0") : d.format);
         case SpecialField::PrintDate:
-            return m_engine.formatter.format(Value::fromDate(m_engine.printDate.date()), d.format);
+            return m_layout.formatter.format(Value::fromDate(m_layout.printDate.date()), d.format);
         case SpecialField::PageNofM: {
             QString shown
                 = d.format.isEmpty() ? QStringLiteral("Page {page} of {pages}") : d.format;
-            shown.replace(QStringLiteral("{page}"), QString::number(m_engine.pageNumber));
+            shown.replace(QStringLiteral("{page}"), QString::number(m_layout.pageNumber));
             return shown.replace(QStringLiteral("{pages}"),
-                m_engine.totalPages > 0 ? QString::number(m_engine.totalPages) : QString());
+                m_layout.totalPages > 0 ? QString::number(m_layout.totalPages) : QString());
         }
         case SpecialField::RecordNumber:
             if (m_position < 0)
                 return {};
-            return m_engine.formatter.format(Value::number(static_cast<double>(m_position + 1)),
+            return m_layout.formatter.format(Value::number(static_cast<double>(m_position + 1)),
                 d.format.isEmpty() ? QStringLiteral("0") : d.format);
         }
         return {};
@@ -393,7 +393,7 @@ Value Pass::fieldValue(const ReportObject& object)
         return {};
     const Value* record = m_records->record(m_result->records[static_cast<size_t>(m_position)]);
     try {
-        return FormulaEvaluator::evaluate(*found->second, record, m_engine.printDate);
+        return FormulaEvaluator::evaluate(*found->second, record, m_layout.printDate);
     } catch (const FormulaException& error) {
         raiseError(Error::FormulaError, error.error().describe());
     }
@@ -414,7 +414,7 @@ int Pass::fontOf(const ReportObject& object)
     const auto found = m_fonts.find(&object);
     if (found != m_fonts.end())
         return found->second;
-    const int font = m_engine.shaper.font(object.current().font);
+    const int font = m_layout.shaper.font(object.current().font);
     m_fonts.emplace(&object, font);
     return font;
 }
@@ -444,7 +444,7 @@ Pass::Prepared Pass::prepare(const Instance& instance)
     Section& section = *instance.section;
     Prepared p;
     p.height = section.height();
-    const bool drawing = m_engine.drawing();
+    const bool drawing = m_layout.drawing();
     for (const auto& o : section.objects()) {
         const ObjectDefinition& d = o->current();
         if (d.suppressed)
@@ -469,13 +469,13 @@ Pass::Prepared Pass::prepare(const Instance& instance)
                 break;
             const QString shown = text(*o);
             if (grows) {
-                const auto& metrics = m_engine.shaper.metrics(item.font);
-                for (const QString& line : m_engine.shaper.wrap(shown, item.font, d.width))
-                    item.lines.push_back(m_engine.shaper.shape(line, item.font));
+                const auto& metrics = m_layout.shaper.metrics(item.font);
+                for (const QString& line : m_layout.shaper.wrap(shown, item.font, d.width))
+                    item.lines.push_back(m_layout.shaper.shape(line, item.font));
                 height = std::max<double>(d.height,
                     std::ceil(static_cast<double>(item.lines.size()) * metrics.lineHeight()));
             } else if (!shown.isEmpty()) {
-                item.lines.push_back(m_engine.shaper.shape(shown, item.font));
+                item.lines.push_back(m_layout.shaper.shape(shown, item.font));
             }
             break;
         }
@@ -485,7 +485,7 @@ Pass::Prepared Pass::prepare(const Instance& instance)
             break;
         case Kind::Blob:
             if (drawing)
-                item.image = m_engine.blobImage(fieldValue(*o));
+                item.image = m_layout.blobImage(fieldValue(*o));
             break;
         case Kind::Subreport:
             p.subreports.push_back(o.get());
@@ -515,17 +515,17 @@ void Pass::drawText(const Item& item, double left, double top)
             || d.special == SpecialField::PageNofM)) {
         const QString shown = text(*item.object);
         if (!shown.isEmpty())
-            lines.push_back(m_engine.shaper.shape(shown, item.font));
+            lines.push_back(m_layout.shaper.shape(shown, item.font));
     }
     if (lines.empty() || item.font < 0)
         return;
-    const auto& metrics = m_engine.shaper.metrics(item.font);
+    const auto& metrics = m_layout.shaper.metrics(item.font);
     const QRgb color = colorOf(d.color);
     const double boxLeft = left + item.rect.left();
     const double width = item.rect.width();
     double baseline = top + item.rect.top() + metrics.ascent;
     for (const auto& line : lines) {
-        if (baseline - metrics.ascent > m_engine.geometry.height)
+        if (baseline - metrics.ascent > m_layout.geometry.height)
             break;
         Page::Text t;
         t.text = line;
@@ -544,14 +544,14 @@ void Pass::drawText(const Item& item, double left, double top)
         t.underlineY = metrics.underlinePosition;
         t.underlineWidth = metrics.lineWidth;
         if (t.glyphCount > 0)
-            m_engine.page.texts.push_back(std::move(t));
+            m_layout.page.texts.push_back(std::move(t));
         baseline += metrics.lineHeight();
     }
 }
 
 void Pass::draw(const Prepared& prepared, double top)
 {
-    const QRectF pageRect(0, 0, m_engine.geometry.width, m_engine.geometry.height);
+    const QRectF pageRect(0, 0, m_layout.geometry.width, m_layout.geometry.height);
     for (const Item& item : prepared.items) {
         const ObjectDefinition& d = item.object->current();
         const QRectF rect = item.rect.translated(m_x, top);
@@ -569,13 +569,13 @@ void Pass::draw(const Prepared& prepared, double top)
             const QPointF to(rect.left() + d.width, rect.top() + d.height);
             if ((d.width > 0 || d.height > 0) && d.lineWidth > 0
                 && QRectF(from, to).normalized().adjusted(-1, -1, 1, 1).intersects(pageRect))
-                m_engine.page.lines.push_back(
+                m_layout.page.lines.push_back(
                     { from, to, static_cast<double>(d.lineWidth), colorOf(d.color) });
             break;
         }
         case Kind::Box:
             if (!visible.isEmpty())
-                m_engine.page.boxes.push_back({ rect, static_cast<double>(d.lineWidth),
+                m_layout.page.boxes.push_back({ rect, static_cast<double>(d.lineWidth),
                     colorOf(d.color), !d.fillColor.isEmpty(), colorOf(d.fillColor) });
             break;
         case Kind::Picture:
@@ -587,7 +587,7 @@ void Pass::draw(const Prepared& prepared, double top)
             size.scale(rect.size(), Qt::KeepAspectRatio);
             const QRectF target(rect.left() + (rect.width() - size.width()) / 2,
                 rect.top() + (rect.height() - size.height()) / 2, size.width(), size.height());
-            m_engine.page.pictures.push_back({ target, visible, item.image });
+            m_layout.page.pictures.push_back({ target, visible, item.image });
             break;
         }
         case Kind::Subreport:
@@ -601,8 +601,8 @@ void Pass::place(const Instance& instance, double keepWithNext)
     Section& section = *instance.section;
     if (section.isSuppressed())
         return;
-    if (section.newPageBefore() && m_engine.hasBody)
-        m_engine.breakPage();
+    if (section.newPageBefore() && m_layout.hasBody)
+        m_layout.breakPage();
     setContext(instance);
     std::optional<FormatGuard> guard;
     if (section.hasFormatHandlers()) {
@@ -611,29 +611,29 @@ void Pass::place(const Instance& instance, double keepWithNext)
     }
     // Counting pages, a section whose height cannot change needs no preparing.
     const std::optional<double> fixed
-        = m_engine.drawing() || guard ? std::nullopt : fixedHeight(section);
+        = m_layout.drawing() || guard ? std::nullopt : fixedHeight(section);
     const Prepared prepared = fixed ? Prepared { *fixed, {}, {} } : prepare(instance);
     if (prepared.height > 0 || !prepared.subreports.empty()) {
-        const double body = m_engine.bodyBottom - m_engine.geometry.top;
+        const double body = m_layout.bodyBottom - m_layout.geometry.top;
         const double needed
             = prepared.height + (prepared.height + keepWithNext <= body ? keepWithNext : 0);
-        if (m_engine.hasBody
-            && (m_engine.pendingBreak || m_engine.y + needed > m_engine.bodyBottom)) {
-            m_engine.breakPage();
+        if (m_layout.hasBody
+            && (m_layout.pendingBreak || m_layout.y + needed > m_layout.bodyBottom)) {
+            m_layout.breakPage();
             setContext(instance);
         }
-        m_engine.pendingBreak = false;
+        m_layout.pendingBreak = false;
     }
-    const double top = m_engine.y;
-    if (m_engine.drawing())
+    const double top = m_layout.y;
+    if (m_layout.drawing())
         draw(prepared, top);
-    m_engine.y = top + prepared.height;
+    m_layout.y = top + prepared.height;
     if (prepared.height > 0)
-        m_engine.hasBody = true;
+        m_layout.hasBody = true;
     if (!prepared.subreports.empty())
         layOutSubreports(instance, prepared, top);
     if (section.newPageAfter())
-        m_engine.pendingBreak = true;
+        m_layout.pendingBreak = true;
 }
 
 void Pass::placeAt(const Instance& instance, double top)
@@ -648,9 +648,9 @@ void Pass::placeAt(const Instance& instance, double top)
         section.raiseFormat();
     }
     const Prepared prepared = prepare(instance);
-    if (m_engine.drawing())
+    if (m_layout.drawing())
         draw(prepared, top);
-    m_engine.y = top + prepared.height;
+    m_layout.y = top + prepared.height;
 }
 
 void Pass::placePageHeader()
@@ -661,16 +661,16 @@ void Pass::placePageHeader()
         { m_bands.pageHeader,
             m_result && m_next < static_cast<qsizetype>(m_result->records.size()) ? m_next
                                                                                   : m_lastPlaced },
-        m_engine.y);
+        m_layout.y);
 }
 
 void Pass::placePageFooter()
 {
     if (!m_bands.pageFooter || m_bands.pageFooter->isSuppressed())
         return;
-    const double y = m_engine.y;
-    placeAt({ m_bands.pageFooter, m_lastPlaced }, m_engine.bodyBottom);
-    m_engine.y = y;
+    const double y = m_layout.y;
+    placeAt({ m_bands.pageFooter, m_lastPlaced }, m_layout.bodyBottom);
+    m_layout.y = y;
 }
 
 void Pass::placeReportHeader()
@@ -682,8 +682,8 @@ void Pass::placeReportHeader()
 void Pass::layOutSubreports(const Instance& host, const Prepared& prepared, double top)
 {
     const double height = prepared.height;
-    const int hostPage = m_engine.pageNumber;
-    double end = m_engine.y;
+    const int hostPage = m_layout.pageNumber;
+    double end = m_layout.y;
     int endPage = hostPage;
     for (ReportObject* object : prepared.subreports) {
         const ObjectDefinition& d = object->current();
@@ -700,7 +700,7 @@ void Pass::layOutSubreports(const Instance& host, const Prepared& prepared, doub
                 try {
                     value = FormulaEvaluator::evaluate(*expr,
                         m_records->record(m_result->records[static_cast<size_t>(m_position)]),
-                        m_engine.printDate);
+                        m_layout.printDate);
                 } catch (const FormulaException& error) {
                     raiseError(Error::FormulaError, error.error().describe());
                 }
@@ -721,20 +721,20 @@ void Pass::layOutSubreports(const Instance& host, const Prepared& prepared, doub
         }
         subreport->setRecordSelectionFormula(own);
 
-        m_engine.y = m_engine.pageNumber == hostPage ? top + d.top : end;
-        Pass pass(m_engine, *subreport, m_x + d.left, false);
+        m_layout.y = m_layout.pageNumber == hostPage ? top + d.top : end;
+        Pass pass(m_layout, *subreport, m_x + d.left, false);
         pass.run();
         const double below = std::max(0.0, height - (d.top + d.height));
-        const double subreportEnd = m_engine.y + below;
-        if (m_engine.pageNumber != endPage) {
-            endPage = m_engine.pageNumber;
+        const double subreportEnd = m_layout.y + below;
+        if (m_layout.pageNumber != endPage) {
+            endPage = m_layout.pageNumber;
             end = subreportEnd;
         } else {
             end = std::max(end, subreportEnd);
         }
     }
-    m_engine.y = end;
-    m_engine.hasBody = true;
+    m_layout.y = end;
+    m_layout.hasBody = true;
 }
 
 void Pass::run()
