@@ -10,7 +10,7 @@ bash scripts/setup-debian.sh
 
 build_dir=${LUDMOX_BUILD_DIR:-build}
 output=${1:-out/examples}
-cmake -S . -B "$build_dir" -G Ninja -DCMAKE_BUILD_TYPE=RelWithDebInfo \
+cmake -S . -B "$build_dir" -G Ninja -DCMAKE_BUILD_TYPE=Release \
     -DLUDMOX_WERROR="${LUDMOX_WERROR:-OFF}"
 cmake --build "$build_dir" --target ludmox
 

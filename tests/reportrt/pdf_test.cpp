@@ -1,10 +1,10 @@
 #include "core/comerror.h"
-#include "runtime/parameterfield.h"
 #include "layouttest.h"
 #include "reportrt/exportoptions.h"
 #include "reportrt/reportobject.h"
 #include "reportrt/runtimeerror.h"
 #include "reportrt/section.h"
+#include "runtime/parameterfield.h"
 
 #include <QBuffer>
 #include <QDir>
