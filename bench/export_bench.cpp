@@ -5,6 +5,7 @@
 
 #include "core/comerror.h"
 #include "core/variant.h"
+#include "reportrt/output/registerruntime.h"
 #include "reportrt/report.h"
 #include "runtime/databasetable.h"
 #include "runtime/exportoptions.h"
@@ -135,6 +136,7 @@ int main(int argc, char* argv[])
     if (qEnvironmentVariableIsEmpty("QT_QPA_PLATFORM"))
         qputenv("QT_QPA_PLATFORM", "offscreen");
     QGuiApplication application(argc, argv);
+    reportrt::registerRuntime();
     QCommandLineParser parser;
     parser.addHelpOption();
     parser.addOption({ QStringLiteral("rows"), QStringLiteral("Orders in the database."),

@@ -2,8 +2,8 @@
 // crash, a hang or a leak; a document that reads must also write and read back.
 
 #include "core/comerror.h"
-#include "reportrt/documentreader.h"
-#include "reportrt/documentwriter.h"
+#include "reportrt/document/documentreader.h"
+#include "reportrt/document/documentwriter.h"
 #include "reportrt/report.h"
 
 #include <QByteArray>

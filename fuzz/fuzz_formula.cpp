@@ -1,9 +1,9 @@
 // Fuzz target: the formula language. Parsing, type-checking, folding, evaluation and SQL
 // translation must end in a value, a FormulaException or nothing, never a crash or hang.
 
-#include "reportrt/formulacompiler.h"
-#include "reportrt/formulaevaluator.h"
-#include "reportrt/sqltranslator.h"
+#include "reportrt/data/sqltranslator.h"
+#include "reportrt/formula/formulacompiler.h"
+#include "reportrt/formula/formulaevaluator.h"
 
 #include <QString>
 #include <cstddef>

@@ -6,7 +6,7 @@
 
 #include "core/comerror.h"
 #include "core/variant.h"
-#include "reportrt/install.h"
+#include "reportrt/output/registerruntime.h"
 #include "reportrt/report.h"
 #include "runtime/databasetable.h"
 #include "runtime/exportoptions.h"
@@ -143,7 +143,7 @@ int main(int argc, char* argv[])
         qputenv("QT_QPA_PLATFORM", "offscreen");
     QGuiApplication application(argc, argv);
     QGuiApplication::setApplicationName(QStringLiteral("ludmox"));
-    reportrt::install();
+    reportrt::registerRuntime();
 
     QCommandLineParser parser;
     parser.setApplicationDescription(QStringLiteral("Exports LUD Mox reports."));

@@ -4,7 +4,7 @@
 #include "automation/registry.h"
 #include "automation/server.h"
 #include "dialogcanceller.h"
-#include "reportrt/install.h"
+#include "reportrt/output/registerruntime.h"
 
 #include <QApplication>
 #include <csignal>
@@ -32,7 +32,7 @@ int main(int argc, char* argv[])
     }
 
     QApplication application(argc, argv);
-    reportrt::install();
+    reportrt::registerRuntime();
     QApplication::setApplicationName(QStringLiteral("ludmoxd"));
     QApplication::setQuitOnLastWindowClosed(false);
 

@@ -1,4 +1,4 @@
-#include "classbuilder.h"
+#include "automation/classbuilder.h"
 
 namespace automation {
 

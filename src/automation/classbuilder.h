@@ -1,8 +1,8 @@
 #pragma once
 
-#include "classdescription.h"
-#include "dispatchtraits.h"
-#include "enumerator.h"
+#include "automation/classdescription.h"
+#include "automation/dispatchtraits.h"
+#include "automation/enumerator.h"
 
 #include <QString>
 #include <concepts>

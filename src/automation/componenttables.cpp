@@ -1,4 +1,4 @@
-#include "tables_p.h"
+#include "automation/tables_p.h"
 
 namespace automation {
 

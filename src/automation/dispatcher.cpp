@@ -1,9 +1,9 @@
-#include "dispatcher.h"
+#include "automation/dispatcher.h"
 
+#include "automation/dispatcherror.h"
+#include "automation/enumerator.h"
+#include "automation/registry.h"
 #include "core/comerror.h"
-#include "dispatcherror.h"
-#include "enumerator.h"
-#include "registry.h"
 
 #include <QHash>
 #include <span>

@@ -1,6 +1,6 @@
 #pragma once
 
-#include "classdescription.h"
+#include "automation/classdescription.h"
 #include "core/object.h"
 #include "core/variant.h"
 

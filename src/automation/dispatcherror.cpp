@@ -1,4 +1,4 @@
-#include "dispatcherror.h"
+#include "automation/dispatcherror.h"
 
 namespace automation {
 

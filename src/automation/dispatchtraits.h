@@ -4,11 +4,11 @@
 // conversion of a (declared-type) Variant into the C++ argument and of a C++ result back.
 // Only the class builder uses this.
 
-#include "classdescription.h"
+#include "automation/classdescription.h"
+#include "automation/dispatcherror.h"
 #include "core/comerror.h"
 #include "core/object.h"
 #include "core/variant.h"
-#include "dispatcherror.h"
 
 #include <QString>
 #include <cstdint>

@@ -1,5 +1,5 @@
-#include "registry.h"
-#include "tables_p.h"
+#include "automation/registry.h"
+#include "automation/tables_p.h"
 
 namespace automation {
 

@@ -1,4 +1,4 @@
-#include "enumerator.h"
+#include "automation/enumerator.h"
 
 #include <utility>
 

@@ -1,7 +1,7 @@
-#include "classbuilder.h"
-#include "enumerator.h"
-#include "registry.h"
-#include "tables_p.h"
+#include "automation/classbuilder.h"
+#include "automation/enumerator.h"
+#include "automation/registry.h"
+#include "automation/tables_p.h"
 
 namespace automation {
 

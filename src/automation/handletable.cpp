@@ -1,4 +1,4 @@
-#include "handletable.h"
+#include "automation/handletable.h"
 
 #include <algorithm>
 #include <vector>

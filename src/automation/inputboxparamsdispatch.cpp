@@ -1,8 +1,8 @@
-#include "classbuilder.h"
+#include "automation/classbuilder.h"
+#include "automation/registry.h"
+#include "automation/tables_p.h"
 #include "dialogs/inputboxparams.h"
 #include "dialogs/inputboxparamsitem.h"
-#include "registry.h"
-#include "tables_p.h"
 
 namespace automation {
 

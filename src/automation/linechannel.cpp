@@ -1,4 +1,4 @@
-#include "linechannel.h"
+#include "automation/linechannel.h"
 
 #include <QCoreApplication>
 #include <QSocketNotifier>

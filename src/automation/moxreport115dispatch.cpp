@@ -1,12 +1,12 @@
-#include "classbuilder.h"
+#include "automation/classbuilder.h"
+#include "automation/registry.h"
+#include "automation/tables_p.h"
 #include "core/collection.h"
 #include "core/dictionary.h"
-#include "registry.h"
 #include "reports/moxevents115.h"
 #include "reports/moxreport115.h"
 #include "reports/moxstatus115.h"
 #include "runtime/report.h"
-#include "tables_p.h"
 
 namespace automation {
 

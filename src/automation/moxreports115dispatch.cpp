@@ -1,8 +1,8 @@
-#include "classbuilder.h"
-#include "registry.h"
+#include "automation/classbuilder.h"
+#include "automation/registry.h"
+#include "automation/tables_p.h"
 #include "reports/moxreport115.h"
 #include "reports/moxreports115.h"
-#include "tables_p.h"
 
 namespace automation {
 

@@ -1,7 +1,7 @@
-#include "registry.h"
+#include "automation/registry.h"
 
+#include "automation/tables_p.h"
 #include "core/eventsource.h"
-#include "tables_p.h"
 
 #include <QSet>
 #include <stdexcept>

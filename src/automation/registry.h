@@ -1,6 +1,6 @@
 #pragma once
 
-#include "classdescription.h"
+#include "automation/classdescription.h"
 
 #include <QHash>
 #include <QString>

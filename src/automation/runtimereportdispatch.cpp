@@ -1,7 +1,7 @@
-#include "classbuilder.h"
-#include "registry.h"
+#include "automation/classbuilder.h"
+#include "automation/registry.h"
+#include "automation/tables_p.h"
 #include "runtime/report.h"
-#include "tables_p.h"
 
 namespace automation {
 

@@ -1,15 +1,15 @@
-#include "server.h"
+#include "automation/server.h"
 
+#include "automation/dispatcher.h"
+#include "automation/dispatcherror.h"
+#include "automation/handletable.h"
+#include "automation/jsontext.h"
+#include "automation/linechannel.h"
+#include "automation/registry.h"
+#include "automation/typelibrary.h"
+#include "automation/valuecodec.h"
 #include "core/comerror.h"
 #include "core/eventsource.h"
-#include "dispatcher.h"
-#include "dispatcherror.h"
-#include "handletable.h"
-#include "jsontext.h"
-#include "linechannel.h"
-#include "registry.h"
-#include "typelibrary.h"
-#include "valuecodec.h"
 
 #include <QCborArray>
 #include <QCborMap>

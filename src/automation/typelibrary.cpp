@@ -1,7 +1,7 @@
-#include "typelibrary.h"
+#include "automation/typelibrary.h"
 
-#include "registry.h"
-#include "valuecodec.h"
+#include "automation/registry.h"
+#include "automation/valuecodec.h"
 
 #include <QCborArray>
 

@@ -1,4 +1,4 @@
-#include "valuecodec.h"
+#include "automation/valuecodec.h"
 
 #include <QCborArray>
 #include <QCborMap>

@@ -1,7 +1,7 @@
 #pragma once
 
+#include "automation/handletable.h"
 #include "core/variant.h"
-#include "handletable.h"
 
 #include <QCborValue>
 #include <QString>

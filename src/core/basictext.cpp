@@ -1,4 +1,4 @@
-#include "basictext_p.h"
+#include "core/basictext_p.h"
 
 #include <QStringView>
 #include <algorithm>

@@ -1,6 +1,6 @@
-#include "collection.h"
+#include "core/collection.h"
 
-#include "comerror.h"
+#include "core/comerror.h"
 
 namespace core {
 

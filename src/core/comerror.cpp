@@ -1,4 +1,4 @@
-#include "comerror.h"
+#include "core/comerror.h"
 
 namespace core {
 

@@ -1,30 +1,15 @@
-#include "dictionary.h"
+#include "core/dictionary.h"
 
-#include "comerror.h"
+#include "core/comerror.h"
 
 namespace core {
 
 namespace {
 
-bool isNumberKey(VariantType type)
-{
-    switch (type) {
-    case VariantType::Byte:
-    case VariantType::Integer:
-    case VariantType::Long:
-    case VariantType::Single:
-    case VariantType::Double:
-    case VariantType::Currency:
-        return true;
-    default:
-        return false;
-    }
-}
-
 bool sameKey(const Variant& a, const Variant& b, Dictionary::CompareMode mode)
 {
     // Numbers are one key whatever their type (1, 1.0 and CCur(1)); text "1" is another.
-    if (isNumberKey(a.type()) && isNumberKey(b.type()))
+    if (isNumberType(a.type()) && isNumberType(b.type()))
         return a.toDouble() == b.toDouble();
     if (a.type() != b.type())
         return false;

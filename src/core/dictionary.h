@@ -1,7 +1,7 @@
 #pragma once
 
-#include "object.h"
-#include "variant.h"
+#include "core/object.h"
+#include "core/variant.h"
 
 #include <vector>
 

@@ -1,6 +1,6 @@
-#include "eventsource.h"
+#include "core/eventsource.h"
 
-#include "comerror.h"
+#include "core/comerror.h"
 
 #include <algorithm>
 

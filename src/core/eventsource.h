@@ -1,6 +1,6 @@
 #pragma once
 
-#include "variant.h"
+#include "core/variant.h"
 
 #include <QString>
 #include <functional>

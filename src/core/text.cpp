@@ -1,7 +1,9 @@
-#include "text.h"
+#include "core/text.h"
 
-#include "basictext_p.h"
-#include "comerror.h"
+#include "core/dateformatting_p.h"
+#include "core/dateparsing_p.h"
+#include "core/numbertext_p.h"
+#include "core/comerror.h"
 
 #include <QLocale>
 #include <utility>

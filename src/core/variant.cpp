@@ -1,7 +1,9 @@
-#include "variant.h"
+#include "core/variant.h"
 
-#include "basictext_p.h"
-#include "comerror.h"
+#include "core/dateformatting_p.h"
+#include "core/dateparsing_p.h"
+#include "core/numbertext_p.h"
+#include "core/comerror.h"
 
 #include <cmath>
 #include <limits>
@@ -9,6 +11,21 @@
 #include <ostream>
 
 namespace core {
+
+bool isNumberType(VariantType type)
+{
+    switch (type) {
+    case VariantType::Byte:
+    case VariantType::Integer:
+    case VariantType::Long:
+    case VariantType::Single:
+    case VariantType::Double:
+    case VariantType::Currency:
+        return true;
+    default:
+        return false;
+    }
+}
 
 namespace {
 
@@ -94,22 +111,11 @@ QString invariantDateText(double oleDate)
     return detail::formatDateTime(date, time, pattern, QLocale::c());
 }
 
+// What arithmetic accepts as a number: Basic converts dates, Booleans and Empty too.
 bool isNumericType(VariantType type)
 {
-    switch (type) {
-    case VariantType::Byte:
-    case VariantType::Integer:
-    case VariantType::Long:
-    case VariantType::Single:
-    case VariantType::Double:
-    case VariantType::Currency:
-    case VariantType::Date:
-    case VariantType::Boolean:
-    case VariantType::Empty:
-        return true;
-    default:
-        return false;
-    }
+    return isNumberType(type) || type == VariantType::Date || type == VariantType::Boolean
+        || type == VariantType::Empty;
 }
 
 Variant defaultElement(VariantType type)

@@ -1,6 +1,6 @@
 #pragma once
 
-#include "object.h"
+#include "core/object.h"
 
 #include <QDateTime>
 #include <QLocale>
@@ -38,6 +38,9 @@ enum class VariantType : int16_t {
     Byte = 17,
     Array = 0x2000,
 };
+
+/// Whether values of the type are numbers: Byte, Integer, Long, Single, Double, Currency.
+bool isNumberType(VariantType type);
 
 /// An automation value with the Basic conversion rules.
 ///

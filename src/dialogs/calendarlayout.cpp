@@ -1,4 +1,4 @@
-#include "calendarlayout.h"
+#include "dialogs/calendarlayout.h"
 
 #include <algorithm>
 

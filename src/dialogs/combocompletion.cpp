@@ -1,4 +1,4 @@
-#include "combocompletion.h"
+#include "dialogs/combocompletion.h"
 
 namespace dialogs {
 

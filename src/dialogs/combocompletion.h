@@ -1,6 +1,6 @@
 #pragma once
 
-#include "textedit.h"
+#include "dialogs/textedit.h"
 
 #include <QStringList>
 

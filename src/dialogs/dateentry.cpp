@@ -1,4 +1,4 @@
-#include "dateentry.h"
+#include "dialogs/dateentry.h"
 
 #include "core/text.h"
 

@@ -1,7 +1,7 @@
 #pragma once
 
-#include "dateentrysettings.h"
-#include "textedit.h"
+#include "dialogs/dateentrysettings.h"
+#include "dialogs/textedit.h"
 
 #include <QDate>
 #include <QString>

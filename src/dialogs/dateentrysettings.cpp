@@ -1,4 +1,4 @@
-#include "dateentrysettings.h"
+#include "dialogs/dateentrysettings.h"
 
 #include "core/text.h"
 

@@ -1,4 +1,4 @@
-#include "dialogslogging_p.h"
+#include "dialogs/dialogslogging_p.h"
 
 namespace dialogs {
 Q_LOGGING_CATEGORY(lcDialogs, "ludmox.dialogs")

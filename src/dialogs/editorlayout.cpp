@@ -1,4 +1,4 @@
-#include "editorlayout.h"
+#include "dialogs/editorlayout.h"
 
 #include <algorithm>
 

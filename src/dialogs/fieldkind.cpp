@@ -1,6 +1,6 @@
-#include "fieldkind.h"
+#include "dialogs/fieldkind.h"
 
-#include "inputboxparamsitem.h"
+#include "dialogs/inputboxparamsitem.h"
 
 namespace dialogs {
 

@@ -1,14 +1,14 @@
-#include "frmcalendar.h"
+#include "dialogs/frmcalendar.h"
 
-#include "calendarlayout.h"
 #include "core/comerror.h"
 #include "core/text.h"
-#include "dialogslogging_p.h"
+#include "dialogs/calendarlayout.h"
+#include "dialogs/dialogslogging_p.h"
+#include "dialogs/ludsettings.h"
+#include "dialogs/uistrings.h"
 #include "engine/moxglobals.h"
-#include "ludsettings.h"
 #include "platform/olecolor.h"
 #include "platform/twips.h"
-#include "uistrings.h"
 
 #include <QCalendarWidget>
 #include <QDateTime>

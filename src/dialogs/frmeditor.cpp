@@ -1,13 +1,13 @@
-#include "frmeditor.h"
+#include "dialogs/frmeditor.h"
 
 #include "core/comerror.h"
-#include "dialogslogging_p.h"
-#include "editorlayout.h"
+#include "dialogs/dialogslogging_p.h"
+#include "dialogs/editorlayout.h"
+#include "dialogs/ludsettings.h"
+#include "dialogs/uistrings.h"
 #include "engine/moxglobals.h"
-#include "ludsettings.h"
 #include "platform/olecolor.h"
 #include "platform/twips.h"
-#include "uistrings.h"
 
 #include <QFontDatabase>
 #include <QGuiApplication>

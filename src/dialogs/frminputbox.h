@@ -1,7 +1,7 @@
 #pragma once
 
-#include "inputboxlayout.h"
-#include "inputboxparams.h"
+#include "dialogs/inputboxlayout.h"
+#include "dialogs/inputboxparams.h"
 
 #include <QDialog>
 #include <QHash>

@@ -1,4 +1,4 @@
-#include "inputboxlayout.h"
+#include "dialogs/inputboxlayout.h"
 
 #include "core/comerror.h"
 

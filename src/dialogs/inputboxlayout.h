@@ -1,7 +1,7 @@
 #pragma once
 
 #include "core/variant.h"
-#include "fieldkind.h"
+#include "dialogs/fieldkind.h"
 
 #include <QRect>
 #include <QString>

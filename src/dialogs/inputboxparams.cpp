@@ -1,4 +1,4 @@
-#include "inputboxparams.h"
+#include "dialogs/inputboxparams.h"
 
 #include <algorithm>
 

@@ -2,7 +2,7 @@
 
 #include "core/object.h"
 #include "core/variant.h"
-#include "inputboxparamsitem.h"
+#include "dialogs/inputboxparamsitem.h"
 
 #include <QString>
 #include <cstdint>

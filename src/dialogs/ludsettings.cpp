@@ -1,4 +1,4 @@
-#include "ludsettings.h"
+#include "dialogs/ludsettings.h"
 
 namespace dialogs {
 

@@ -1,8 +1,8 @@
-#include "numberentry.h"
+#include "dialogs/numberentry.h"
 
 #include "core/comerror.h"
 #include "core/variant.h"
-#include "textedit.h"
+#include "dialogs/textedit.h"
 
 #include <QLocale>
 

@@ -1,4 +1,4 @@
-#include "textedit.h"
+#include "dialogs/textedit.h"
 
 namespace dialogs {
 

@@ -1,4 +1,4 @@
-#include "uistrings.h"
+#include "dialogs/uistrings.h"
 
 #include "core/comerror.h"
 #include "engine/moxglobals.h"

@@ -1,4 +1,4 @@
-#include "luderrorhandler.h"
+#include "engine/luderrorhandler.h"
 
 #include "core/comerror.h"
 

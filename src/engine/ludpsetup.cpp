@@ -1,4 +1,4 @@
-#include "ludpsetup.h"
+#include "engine/ludpsetup.h"
 
 #include "platform/currentprinter.h"
 #include "platform/printdialogservice.h"

@@ -1,9 +1,9 @@
-#include "moxengine115.h"
+#include "engine/moxengine115.h"
 
 #include "core/comerror.h"
-#include "luderrorhandler.h"
-#include "ludpsetup.h"
-#include "moxglobals.h"
+#include "engine/luderrorhandler.h"
+#include "engine/ludpsetup.h"
+#include "engine/moxglobals.h"
 #include "platform/currentprinter.h"
 #include "platform/printers.h"
 #include "platform/tempfolder.h"

@@ -2,7 +2,7 @@
 
 #include "core/object.h"
 #include "core/variant.h"
-#include "moxservertypes.h"
+#include "engine/moxservertypes.h"
 
 #include <QString>
 #include <cstdint>

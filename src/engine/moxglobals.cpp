@@ -1,4 +1,4 @@
-#include "moxglobals.h"
+#include "engine/moxglobals.h"
 
 #include "core/text.h"
 #include "runtime/application.h"

@@ -1,6 +1,6 @@
 #pragma once
 
-#include "moxservertypes.h"
+#include "engine/moxservertypes.h"
 
 #include <QString>
 #include <cstdint>

@@ -1,7 +1,7 @@
-#include "currentprinter.h"
+#include "platform/currentprinter.h"
 
-#include "printerdevice.h"
-#include "printers.h"
+#include "platform/printerdevice.h"
+#include "platform/printers.h"
 
 namespace platform {
 

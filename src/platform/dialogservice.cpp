@@ -1,6 +1,6 @@
-#include "dialogservice.h"
+#include "platform/dialogservice.h"
 
-#include "qtdialogservice.h"
+#include "platform/qtdialogservice.h"
 
 #include <utility>
 

@@ -1,6 +1,6 @@
-#include "messageboxservice.h"
+#include "platform/messageboxservice.h"
 
-#include "windowhandles.h"
+#include "platform/windowhandles.h"
 
 #include <QCoreApplication>
 #include <QMessageBox>

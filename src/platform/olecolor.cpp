@@ -1,4 +1,4 @@
-#include "olecolor.h"
+#include "platform/olecolor.h"
 
 #include <QGuiApplication>
 #include <QPalette>

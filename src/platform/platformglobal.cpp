@@ -1,4 +1,4 @@
-#include "platformglobal_p.h"
+#include "platform/platformglobal_p.h"
 
 using namespace Qt::StringLiterals;
 

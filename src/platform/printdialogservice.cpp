@@ -1,6 +1,6 @@
-#include "printdialogservice.h"
+#include "platform/printdialogservice.h"
 
-#include "qtprintdialogservice.h"
+#include "platform/qtprintdialogservice.h"
 
 #include <utility>
 

@@ -1,7 +1,7 @@
 #pragma once
 
-#include "printerinfo.h"
-#include "printsettings.h"
+#include "platform/printerinfo.h"
+#include "platform/printsettings.h"
 
 #include <QString>
 #include <cstdint>

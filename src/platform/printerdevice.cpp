@@ -1,7 +1,7 @@
-#include "printerdevice.h"
+#include "platform/printerdevice.h"
 
-#include "platformglobal_p.h"
-#include "printsettings.h"
+#include "platform/platformglobal_p.h"
+#include "platform/printsettings.h"
 
 #include <QDir>
 #include <QFile>

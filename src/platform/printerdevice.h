@@ -1,6 +1,6 @@
 #pragma once
 
-#include "printerinfo.h"
+#include "platform/printerinfo.h"
 
 #include <QDateTime>
 #include <QPrinter>

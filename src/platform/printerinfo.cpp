@@ -1,6 +1,6 @@
-#include "printerinfo.h"
+#include "platform/printerinfo.h"
 
-#include "printers.h"
+#include "platform/printers.h"
 
 #include <utility>
 

@@ -1,6 +1,6 @@
-#include "printsettings.h"
+#include "platform/printsettings.h"
 
-#include "platformglobal_p.h"
+#include "platform/platformglobal_p.h"
 
 #include <QPageLayout>
 #include <QPageSize>

@@ -1,7 +1,7 @@
-#include "qtdialogservice.h"
+#include "platform/qtdialogservice.h"
 
-#include "olecolor.h"
-#include "windowhandles.h"
+#include "platform/olecolor.h"
+#include "platform/windowhandles.h"
 
 #include <QColorDialog>
 #include <QFileDialog>

@@ -1,7 +1,7 @@
-#include "qtprintdialogservice.h"
+#include "platform/qtprintdialogservice.h"
 
-#include "printers.h"
-#include "windowhandles.h"
+#include "platform/printers.h"
+#include "platform/windowhandles.h"
 
 #include <QDir>
 #include <QPrintDialog>

@@ -1,6 +1,6 @@
 #pragma once
 
-#include "printdialogservice.h"
+#include "platform/printdialogservice.h"
 
 namespace platform {
 

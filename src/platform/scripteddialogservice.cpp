@@ -1,4 +1,4 @@
-#include "scripteddialogservice.h"
+#include "platform/scripteddialogservice.h"
 
 namespace platform {
 

@@ -1,4 +1,4 @@
-#include "scriptedprintdialogservice.h"
+#include "platform/scriptedprintdialogservice.h"
 
 #include <utility>
 

@@ -1,6 +1,6 @@
-#include "settingsstore.h"
+#include "platform/settingsstore.h"
 
-#include "platformglobal_p.h"
+#include "platform/platformglobal_p.h"
 
 #include <QDir>
 #include <QFileInfo>

@@ -1,6 +1,6 @@
-#include "tempfolder.h"
+#include "platform/tempfolder.h"
 
-#include "platformglobal_p.h"
+#include "platform/platformglobal_p.h"
 
 #include <QDir>
 #include <QFile>

@@ -1,4 +1,4 @@
-#include "windowhandles.h"
+#include "platform/windowhandles.h"
 
 #include <QApplication>
 #include <QWidget>

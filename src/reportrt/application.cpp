@@ -1,9 +1,9 @@
-#include "application.h"
+#include "reportrt/application.h"
 
-#include "providermap.h"
-#include "report.h"
-#include "runtimeerror.h"
-#include "sqlconnection.h"
+#include "reportrt/base/runtimeerror.h"
+#include "reportrt/data/providermap.h"
+#include "reportrt/data/sqlconnection.h"
+#include "reportrt/report.h"
 
 namespace reportrt {
 

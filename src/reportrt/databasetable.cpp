@@ -1,9 +1,9 @@
-#include "databasetable.h"
+#include "reportrt/databasetable.h"
 
-#include "providermap.h"
-#include "runtimeerror.h"
-#include "sqlconnection.h"
-#include "sqlstatement.h"
+#include "reportrt/base/runtimeerror.h"
+#include "reportrt/data/providermap.h"
+#include "reportrt/data/sqlconnection.h"
+#include "reportrt/data/sqlstatement.h"
 
 #include <QSqlError>
 #include <QSqlQuery>
@@ -77,26 +77,14 @@ void DatabaseTable::addConnectionProperty(const QString& name, const core::Varia
 {
     ConnectionProperty property;
     property.name = name;
-    switch (value.type()) {
-    case core::VariantType::Boolean:
+    if (value.type() == core::VariantType::Boolean) {
         property.kind = ConnectionProperty::Kind::Boolean;
         property.boolean = value.toBoolean();
-        break;
-    case core::VariantType::Byte:
-    case core::VariantType::Integer:
-    case core::VariantType::Long:
-    case core::VariantType::Single:
-    case core::VariantType::Double:
-    case core::VariantType::Currency:
+    } else if (core::isNumberType(value.type())) {
         property.kind = ConnectionProperty::Kind::Number;
         property.number = value.toDouble();
-        break;
-    case core::VariantType::Empty:
-    case core::VariantType::Null:
-        break;
-    default:
+    } else if (!value.isEmpty() && !value.isNull()) {
         property.text = value.toText();
-        break;
     }
     for (ConnectionProperty& existing : m_definition.connection) {
         if (existing.name.compare(name, Qt::CaseInsensitive) == 0) {

@@ -1,9 +1,9 @@
-#include "parameterfield.h"
+#include "reportrt/parameterfield.h"
 
 #include "core/comerror.h"
-#include "formulaevaluator.h"
-#include "runtimeerror.h"
-#include "variantvalue.h"
+#include "reportrt/base/runtimeerror.h"
+#include "reportrt/base/variantvalue.h"
+#include "reportrt/formula/formulaevaluator.h"
 
 namespace reportrt {
 

@@ -1,24 +1,23 @@
-#include "report.h"
+#include "reportrt/report.h"
 
-#include "databasetable.h"
-#include "documentenvironment.h"
-#include "documentreader.h"
-#include "documentwriter.h"
-#include "exportoptions.h"
-#include "formulacompiler.h"
-#include "formulaevaluator.h"
-#include "parameterfield.h"
-#include "providermap.h"
-#include "recordreader.h"
-#include "reportexporter.h"
-#include "reportobject.h"
-#include "reportprinter.h"
-#include "runtimeerror.h"
-#include "section.h"
-#include "sqlconnection.h"
-#include "sqlstatement.h"
-#include "sqltranslator.h"
-#include "valuecodec.h"
+#include "reportrt/base/invarianttext.h"
+#include "reportrt/base/reportoutput.h"
+#include "reportrt/base/runtimeerror.h"
+#include "reportrt/data/providermap.h"
+#include "reportrt/data/recordreader.h"
+#include "reportrt/data/sqlconnection.h"
+#include "reportrt/data/sqlstatement.h"
+#include "reportrt/data/sqltranslator.h"
+#include "reportrt/databasetable.h"
+#include "reportrt/document/documentenvironment.h"
+#include "reportrt/document/documentreader.h"
+#include "reportrt/document/documentwriter.h"
+#include "reportrt/exportoptions.h"
+#include "reportrt/formula/formulacompiler.h"
+#include "reportrt/formula/formulaevaluator.h"
+#include "reportrt/parameterfield.h"
+#include "reportrt/reportobject.h"
+#include "reportrt/section.h"
 
 #include <QCryptographicHash>
 #include <QRegularExpression>
@@ -485,7 +484,7 @@ void Report::readInto(Plan& p)
 void Report::readRecords()
 {
     m_status = {};
-    m_status.progress = 2;
+    m_status.setProgress(runtime::PrintingProgress::InProgress);
     m_result.reset();
     m_currentRecord = -1;
     try {
@@ -504,17 +503,17 @@ void Report::readRecords()
         m_status.recordsRead = m_saved->recordsRead;
         m_status.recordsSelected = static_cast<int32_t>(m_saved->records.size());
         m_status.recordsPrinted = static_cast<int32_t>(m_result->records.size());
-        m_status.progress = 3;
+        m_status.setProgress(runtime::PrintingProgress::Completed);
         if (m_status.recordsSelected == 0 && m_noDataHandler) {
             bool cancel = false;
             m_noDataHandler(cancel);
             if (cancel) {
-                m_status.progress = 5;
+                m_status.setProgress(runtime::PrintingProgress::Cancelled);
                 m_status.recordsPrinted = 0;
             }
         }
     } catch (...) {
-        m_status.progress = 4;
+        m_status.setProgress(runtime::PrintingProgress::Failed);
         throw;
     }
 }
@@ -553,18 +552,18 @@ int Report::summaryIndex(const ReportObject* object) const
 void Report::printOut(
     bool promptUser, int16_t copies, bool collated, std::optional<runtime::PageRange> pages)
 {
-    ReportPrinter::printOut(*this, promptUser, copies, collated, pages);
+    ReportOutput::installed().printOut(*this, promptUser, copies, collated, pages);
 }
 
 void Report::printerSetup(int32_t parentWindowId)
 {
-    ReportPrinter::printerSetup(*this, parentWindowId);
+    ReportOutput::installed().printerSetup(*this, parentWindowId);
 }
 
 void Report::exportReport(bool promptUser)
 {
     const auto options = std::static_pointer_cast<ExportOptions>(exportOptions());
-    ReportExporter::exportReport(*this, *options, promptUser);
+    ReportOutput::installed().exportReport(*this, *options, promptUser);
 }
 
 void Report::selectPrinter(

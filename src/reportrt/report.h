@@ -1,8 +1,8 @@
 #pragma once
 
-#include "recordprocessor.h"
-#include "recordset.h"
-#include "reportdocument.h"
+#include "reportrt/data/recordprocessor.h"
+#include "reportrt/data/recordset.h"
+#include "reportrt/document/reportdocument.h"
 #include "runtime/report.h"
 
 #include <map>

@@ -1,9 +1,9 @@
-#include "reportobject.h"
+#include "reportrt/reportobject.h"
 
-#include "report.h"
-#include "runtimeerror.h"
-#include "section.h"
-#include "variantvalue.h"
+#include "reportrt/base/runtimeerror.h"
+#include "reportrt/base/variantvalue.h"
+#include "reportrt/report.h"
+#include "reportrt/section.h"
 
 #include <QBuffer>
 

@@ -1,6 +1,6 @@
-#include "section.h"
+#include "reportrt/section.h"
 
-#include "reportobject.h"
+#include "reportrt/reportobject.h"
 
 namespace reportrt {
 

@@ -1,6 +1,6 @@
 #pragma once
 
-#include "reportdocument.h"
+#include "reportrt/document/reportdocument.h"
 #include "runtime/section.h"
 
 #include <map>

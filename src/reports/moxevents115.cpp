@@ -1,4 +1,4 @@
-#include "moxevents115.h"
+#include "reports/moxevents115.h"
 
 #include <array>
 

@@ -5,12 +5,12 @@
 #include "core/text.h"
 #include "engine/moxengine115.h"
 #include "engine/moxglobals.h"
-#include "moxreport115.h"
-#include "moxreport115_p.h"
+#include "reports/moxreport115.h"
+#include "reports/moxreport115_p.h"
+#include "reports/selectiontext.h"
 #include "runtime/application.h"
 #include "runtime/report.h"
 #include "runtime/reportobject.h"
-#include "selectiontext.h"
 
 using namespace Qt::StringLiterals;
 

@@ -4,11 +4,11 @@
 #include "core/comerror.h"
 #include "core/text.h"
 #include "engine/moxglobals.h"
-#include "moxreport115.h"
-#include "moxreport115_p.h"
+#include "reports/moxreport115.h"
+#include "reports/moxreport115_p.h"
+#include "reports/selectiontext.h"
 #include "runtime/databasetable.h"
 #include "runtime/report.h"
-#include "selectiontext.h"
 
 #include <QStringList>
 

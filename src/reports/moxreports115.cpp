@@ -1,9 +1,9 @@
-#include "moxreports115.h"
+#include "reports/moxreports115.h"
 
 #include "core/comerror.h"
 #include "core/text.h"
 #include "engine/moxglobals.h"
-#include "moxreport115.h"
+#include "reports/moxreport115.h"
 
 #include <algorithm>
 #include <utility>

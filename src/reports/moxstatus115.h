@@ -1,7 +1,7 @@
 #pragma once
 
 #include "core/object.h"
-#include "enuprintprogress.h"
+#include "reports/enuprintprogress.h"
 
 #include <cstdint>
 

@@ -1,4 +1,4 @@
-#include "moxviewer6exeglobals.h"
+#include "reports/moxviewer6exeglobals.h"
 
 #include "core/comerror.h"
 #include "core/text.h"
@@ -8,11 +8,12 @@
 #include "dialogs/inputboxparams.h"
 #include "dialogs/uistrings.h"
 #include "engine/moxengine115.h"
-#include "moxreport115.h"
-#include "moxreport115_p.h"
-#include "moxreports115.h"
 #include "platform/windowhandles.h"
+#include "reports/moxreport115.h"
+#include "reports/moxreport115_p.h"
+#include "reports/moxreports115.h"
 #include "runtime/parameterfield.h"
+#include "runtime/parametervaluetype.h"
 
 #include <QDateTime>
 #include <QWidget>
@@ -38,12 +39,17 @@ InputBoxPresenter& installedPresenter()
 
 bool isNumericCode(int16_t code)
 {
-    return code >= 1 && code <= 8;
+    using runtime::ParameterValueType;
+    return code >= static_cast<int16_t>(ParameterValueType::SignedByte)
+        && code <= static_cast<int16_t>(ParameterValueType::Currency);
 }
 
 bool isDateCode(int16_t code)
 {
-    return code == 10 || code == 11 || code == 16;
+    using runtime::ParameterValueType;
+    const auto type = static_cast<ParameterValueType>(code);
+    return type == ParameterValueType::Date || type == ParameterValueType::Time
+        || type == ParameterValueType::DateTime;
 }
 
 /// The parameter's name as the dialog shows it: "{?Customer}" becomes "Customer".

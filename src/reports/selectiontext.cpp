@@ -1,4 +1,4 @@
-#include "selectiontext.h"
+#include "reports/selectiontext.h"
 
 #include "core/collection.h"
 #include "core/dictionary.h"
@@ -33,21 +33,12 @@ bool isPlainNumber(const QString& text)
 // written as a string literal so that it can neither break nor extend the statement.
 QString inListElement(const core::Variant& element)
 {
-    switch (element.type()) {
-    case core::VariantType::Null:
+    if (element.type() == core::VariantType::Null)
         return QStringLiteral("NULL");
-    case core::VariantType::Byte:
-    case core::VariantType::Integer:
-    case core::VariantType::Long:
-    case core::VariantType::Single:
-    case core::VariantType::Double:
-    case core::VariantType::Currency:
+    if (core::isNumberType(element.type()))
         return element.toInvariantText();
-    case core::VariantType::Boolean:
+    if (element.type() == core::VariantType::Boolean)
         return element.toBoolean() ? QStringLiteral("-1") : QStringLiteral("0");
-    default:
-        break;
-    }
     const QString text = element.type() == core::VariantType::String ? element.toText()
                                                                      : element.toInvariantText();
     if (isPlainNumber(text))
@@ -71,18 +62,7 @@ std::vector<core::Variant> elementsOf(const core::Variant& selection)
 
 bool isNumberKind(core::VariantType type)
 {
-    switch (type) {
-    case core::VariantType::Byte:
-    case core::VariantType::Integer:
-    case core::VariantType::Long:
-    case core::VariantType::Single:
-    case core::VariantType::Double:
-    case core::VariantType::Currency:
-    case core::VariantType::Boolean:
-        return true;
-    default:
-        return false;
-    }
+    return core::isNumberType(type) || type == core::VariantType::Boolean;
 }
 
 QString dropTrailingLineBreaks(QString text)

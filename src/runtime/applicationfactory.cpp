@@ -1,7 +1,7 @@
-#include "applicationfactory.h"
+#include "runtime/applicationfactory.h"
 
-#include "application.h"
 #include "core/comerror.h"
+#include "runtime/application.h"
 
 #include <utility>
 

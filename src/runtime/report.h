@@ -1,7 +1,7 @@
 #pragma once
 
 #include "core/object.h"
-#include "printingstatus.h"
+#include "runtime/printingstatus.h"
 
 #include <QString>
 #include <functional>

@@ -1,4 +1,4 @@
-#include "reportobject.h"
+#include "runtime/reportobject.h"
 
 #include "core/comerror.h"
 

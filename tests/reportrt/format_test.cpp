@@ -1,7 +1,7 @@
-#include "reportrt/fonttable.h"
-#include "reportrt/reportdocument.h"
-#include "reportrt/textshaper.h"
-#include "reportrt/valueformatter.h"
+#include "reportrt/document/reportdocument.h"
+#include "reportrt/layout/fonttable.h"
+#include "reportrt/layout/textshaper.h"
+#include "reportrt/layout/valueformatter.h"
 
 #include <gtest/gtest.h>
 

@@ -1,5 +1,5 @@
-#include "reportrt/formulacompiler.h"
-#include "reportrt/formulaevaluator.h"
+#include "reportrt/formula/formulacompiler.h"
+#include "reportrt/formula/formulaevaluator.h"
 #include "reportrttest.h"
 
 #include <gtest/gtest.h>

@@ -1,3 +1,5 @@
+#include "reportrt/output/registerruntime.h"
+
 #include <QGuiApplication>
 #include <gtest/gtest.h>
 
@@ -5,6 +7,7 @@ int main(int argc, char** argv)
 {
     // Fonts need a GUI application; the tests run on the offscreen platform.
     QGuiApplication application(argc, argv);
+    reportrt::registerRuntime();
     testing::InitGoogleTest(&argc, argv);
     return RUN_ALL_TESTS();
 }

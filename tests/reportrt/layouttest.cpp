@@ -1,11 +1,11 @@
 #include "layouttest.h"
 
 #include "core/variant.h"
-#include "reportrt/fonttable.h"
-#include "reportrt/layoutengine.h"
+#include "reportrt/layout/fonttable.h"
+#include "reportrt/layout/layoutengine.h"
+#include "reportrt/layout/textshaper.h"
 #include "reportrt/reportobject.h"
 #include "reportrt/section.h"
-#include "reportrt/textshaper.h"
 #include "runtime/databasetable.h"
 
 #include <QDir>

@@ -1,6 +1,6 @@
 #pragma once
 
-#include "reportrt/page.h"
+#include "reportrt/layout/page.h"
 #include "reportrt/report.h"
 
 #include <QImage>

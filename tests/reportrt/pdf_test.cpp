@@ -1,8 +1,8 @@
 #include "core/comerror.h"
 #include "layouttest.h"
+#include "reportrt/base/runtimeerror.h"
 #include "reportrt/exportoptions.h"
 #include "reportrt/reportobject.h"
-#include "reportrt/runtimeerror.h"
 #include "reportrt/section.h"
 #include "runtime/parameterfield.h"
 

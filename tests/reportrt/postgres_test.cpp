@@ -1,6 +1,6 @@
 #include "core/comerror.h"
-#include "reportrt/install.h"
-#include "reportrt/providermap.h"
+#include "reportrt/data/providermap.h"
+#include "reportrt/output/registerruntime.h"
 #include "reportrt/report.h"
 #include "reportrttest.h"
 #include "runtime/application.h"
@@ -171,7 +171,7 @@ INSTANTIATE_TEST_SUITE_P(Formulas, PostgreSqlPushdown,
 
 TEST_F(PostgreSql, ServerLogonAndLogonFailure)
 {
-    install();
+    registerRuntime();
     const auto application = runtime::ApplicationFactory::create();
     const QString server = m_server.host + u',' + m_server.port;
     application->setMatchLogOnInfo(true);

@@ -4,8 +4,8 @@
 #include "platform/printdialogservice.h"
 #include "platform/printers.h"
 #include "platform/scriptedprintdialogservice.h"
-#include "reportrt/reportprinter.h"
-#include "reportrt/runtimeerror.h"
+#include "reportrt/base/runtimeerror.h"
+#include "reportrt/output/reportprinter.h"
 
 #include <QDir>
 #include <QRegularExpression>

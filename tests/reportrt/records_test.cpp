@@ -1,8 +1,8 @@
 #include "core/comerror.h"
 #include "reportrt/application.h"
-#include "reportrt/install.h"
+#include "reportrt/base/runtimeerror.h"
+#include "reportrt/output/registerruntime.h"
 #include "reportrt/report.h"
-#include "reportrt/runtimeerror.h"
 #include "reportrttest.h"
 #include "runtime/applicationfactory.h"
 #include "runtime/databasetable.h"
@@ -399,7 +399,7 @@ TEST(Application, LogOnToAFileDatabaseAndToAnUnreachableServer)
 {
     QTemporaryDir dir;
     const QString db = createShopDatabase(dir.filePath(QStringLiteral("shop.db")));
-    install();
+    registerRuntime();
     const auto application = runtime::ApplicationFactory::create();
     EXPECT_EQ(application, runtime::ApplicationFactory::create());
     application->setMatchLogOnInfo(true);

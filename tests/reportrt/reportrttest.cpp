@@ -1,7 +1,7 @@
 #include "reportrttest.h"
 
 #include "core/variant.h"
-#include "reportrt/formulaevaluator.h"
+#include "reportrt/formula/formulaevaluator.h"
 
 #include <QFile>
 #include <QJsonDocument>

@@ -1,7 +1,7 @@
 // The report object over the real report runtime, on a SQLite database made by the test:
 // the selection reaches the runtime's formula and statement, and the records read follow.
 
-#include "reportrt/install.h"
+#include "reportrt/output/registerruntime.h"
 #include "reporttest.h"
 #include "runtime/applicationfactory.h"
 #include "runtime/report.h"
@@ -74,7 +74,7 @@ protected:
     {
         ASSERT_TRUE(m_folder.isValid());
         m_previousFactory = runtime::ApplicationFactory::install(nullptr);
-        reportrt::install();
+        reportrt::registerRuntime();
         engine::ReleaseApplication();
         m_database = m_folder.filePath(u"shop.db"_s);
         createShop(m_database);

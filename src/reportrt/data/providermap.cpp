@@ -1,0 +1,285 @@
+#include "reportrt/data/providermap.h"
+
+#include "reportrt/base/runtimeerror.h"
+
+#include <QCryptographicHash>
+#include <QFileInfo>
+
+namespace reportrt {
+
+namespace {
+struct Settings {
+    QString serverDriver;
+    QString odbcDriver;
+    std::vector<ConnectionSpec> logons;
+    std::vector<std::pair<QString, QString>> logonKeys; // server, database
+    bool matchLogOnInfo = false;
+};
+
+Settings& settings()
+{
+    static Settings instance;
+    return instance;
+}
+
+const ConnectionProperty* property(
+    const std::vector<ConnectionProperty>& properties, const char16_t* name)
+{
+    for (const auto& p : properties) {
+        if (p.name.compare(QStringView(name), Qt::CaseInsensitive) == 0)
+            return &p;
+    }
+    return nullptr;
+}
+
+QString text(const std::vector<ConnectionProperty>& properties, const char16_t* name)
+{
+    const ConnectionProperty* p = property(properties, name);
+    if (!p)
+        return {};
+    switch (p->kind) {
+    case ConnectionProperty::Kind::Text:
+        return p->text;
+    case ConnectionProperty::Kind::Boolean:
+        return p->boolean ? QStringLiteral("True") : QStringLiteral("False");
+    case ConnectionProperty::Kind::Number:
+        return QString::number(p->number);
+    }
+    return {};
+}
+
+bool flag(const std::vector<ConnectionProperty>& properties, const char16_t* name)
+{
+    const ConnectionProperty* p = property(properties, name);
+    if (!p)
+        return false;
+    if (p->kind == ConnectionProperty::Kind::Boolean)
+        return p->boolean;
+    if (p->kind == ConnectionProperty::Kind::Number)
+        return p->number != 0;
+    const QString t = p->text.trimmed();
+    return t.compare(u"true", Qt::CaseInsensitive) == 0
+        || t.compare(u"yes", Qt::CaseInsensitive) == 0
+        || t.compare(u"sspi", Qt::CaseInsensitive) == 0 || t == u"1" || t == u"-1";
+}
+
+bool isJet(const QString& provider)
+{
+    return provider.startsWith(u"Microsoft.Jet.OLEDB", Qt::CaseInsensitive)
+        || provider.startsWith(u"Microsoft.ACE.OLEDB", Qt::CaseInsensitive)
+        || provider.compare(u"SQLite", Qt::CaseInsensitive) == 0;
+}
+
+bool isSqlServer(const QString& provider)
+{
+    for (const char16_t* name :
+        { u"SQLOLEDB", u"SQLNCLI", u"SQLNCLI10", u"SQLNCLI11", u"MSOLEDBSQL", u"MSOLEDBSQL19" }) {
+        if (provider.compare(QStringView(name), Qt::CaseInsensitive) == 0
+            || provider.startsWith(QString::fromUtf16(name) + u'.', Qt::CaseInsensitive))
+            return true;
+    }
+    return false;
+}
+
+ConnectionSpec fileDatabase(const QString& path)
+{
+    ConnectionSpec spec;
+    spec.driver = QStringLiteral("QSQLITE");
+    spec.databaseName = path;
+    // Reports only read; the file must exist (SQLite would create an empty one).
+    spec.options = QStringLiteral("QSQLITE_OPEN_READONLY");
+    spec.dialect = SqlDialect::SQLite;
+    return spec;
+}
+
+/// ODBC connect-string values with ";" or braces are written in braces.
+QString odbcValue(const QString& value)
+{
+    if (!value.contains(u';') && !value.contains(u'{') && !value.contains(u'}')
+        && value.trimmed() == value)
+        return value;
+    QString escaped = value;
+    escaped.replace(u'}', QStringLiteral("}}"));
+    return u'{' + escaped + u'}';
+}
+} // namespace
+
+QString ConnectionSpec::describe() const
+{
+    if (driver == u"QSQLITE")
+        return QStringLiteral("SQLite database %1").arg(databaseName);
+    if (driver == u"QPSQL")
+        return QStringLiteral("PostgreSQL database %1 on %2").arg(databaseName, hostName);
+    return QStringLiteral("ODBC database %1 on %2").arg(options, hostName);
+}
+
+QString ConnectionSpec::key() const
+{
+    // The password takes part only as a hash, so the key can be logged.
+    const QByteArray hash
+        = QCryptographicHash::hash(password.toUtf8(), QCryptographicHash::Sha256).toHex();
+    return QStringList { driver, databaseName, hostName, QString::number(port), userName,
+        QString::fromLatin1(hash), options }
+        .join(QChar(0x1F));
+}
+
+ConnectionSpec ProviderMap::forServer(const QString& server, const QString& database,
+    const QString& userId, const QString& password, bool integratedSecurity)
+{
+    const QFileInfo file(server);
+    if (!server.isEmpty() && file.isFile())
+        return fileDatabase(server);
+    ConnectionSpec spec;
+    spec.driver = serverDriver();
+    QString host = server.trimmed();
+    int port = -1;
+    const qsizetype separator = std::max(host.lastIndexOf(u','), host.lastIndexOf(u':'));
+    if (separator > 0) {
+        bool ok = false;
+        const int value = host.mid(separator + 1).trimmed().toInt(&ok);
+        if (ok && value > 0 && value < 65536) {
+            port = value;
+            host = host.left(separator).trimmed();
+        }
+    }
+    if (spec.driver == u"QPSQL") {
+        spec.dialect = SqlDialect::PostgreSQL;
+        spec.hostName = host;
+        spec.port = port;
+        spec.databaseName = database;
+        if (!integratedSecurity || !password.isEmpty()) {
+            spec.userName = userId;
+            spec.password = password;
+        }
+        spec.options = QStringLiteral("connect_timeout=10");
+        return spec;
+    }
+    spec.driver = QStringLiteral("QODBC");
+    spec.dialect = SqlDialect::Generic;
+    spec.hostName = host;
+    spec.port = port;
+    QString connect = QStringLiteral("DRIVER=%1;SERVER=%2;DATABASE=%3;")
+                          .arg(odbcValue(odbcDriver()),
+                              odbcValue(port > 0 ? host + u',' + QString::number(port) : host),
+                              odbcValue(database));
+    if (integratedSecurity && password.isEmpty()) {
+        connect += QStringLiteral("Trusted_Connection=yes;");
+    } else {
+        spec.userName = userId;
+        spec.password = password;
+    }
+    spec.databaseName = connect;
+    spec.options = database;
+    return spec;
+}
+
+ConnectionSpec ProviderMap::fromProperties(const std::vector<ConnectionProperty>& properties)
+{
+    const QString provider = text(properties, u"Provider").trimmed();
+    if (provider.isEmpty())
+        raiseError(Error::TableConnectionFailed,
+            QStringLiteral("Failed to open the connection: the table has no \"Provider\" "
+                           "connection property."));
+    if (isJet(provider)) {
+        const QString path = text(properties, u"Data Source");
+        if (path.isEmpty())
+            raiseError(Error::TableConnectionFailed,
+                QStringLiteral("Failed to open the connection: the table has no \"Data Source\"."));
+        if (!QFileInfo(path).isFile())
+            raiseError(Error::TableConnectionFailed,
+                QStringLiteral(
+                    "Failed to open the connection: the database file %1 does not exist.")
+                    .arg(path));
+        return fileDatabase(path);
+    }
+    if (isSqlServer(provider)) {
+        QString server = text(properties, u"Data Source");
+        if (server.isEmpty())
+            server = text(properties, u"Server Name");
+        QString database = text(properties, u"Initial Catalog");
+        if (database.isEmpty())
+            database = text(properties, u"DataBase");
+        QString user = text(properties, u"User ID");
+        QString password = text(properties, u"Password");
+        const bool integrated = flag(properties, u"Integrated Security");
+        if (server.isEmpty())
+            raiseError(Error::TableConnectionFailed,
+                QStringLiteral("Failed to open the connection: the table has no \"Data Source\"."));
+        if (user.isEmpty() && password.isEmpty() && !integrated && settings().matchLogOnInfo) {
+            if (const auto logon = matchingLogon(server, database)) {
+                user = logon->userName;
+                password = logon->password;
+            }
+        }
+        return forServer(server, database, user, password, integrated);
+    }
+    raiseError(Error::TableConnectionFailed,
+        QStringLiteral("Failed to open the connection: the provider \"%1\" is not supported.")
+            .arg(provider));
+}
+
+void ProviderMap::setServerDriver(const QString& driver)
+{
+    settings().serverDriver = driver;
+}
+
+QString ProviderMap::serverDriver()
+{
+    QString driver = settings().serverDriver;
+    if (driver.isEmpty())
+        driver = qEnvironmentVariable("LUDMOX_SERVER_DRIVER");
+    driver = driver.trimmed().toUpper();
+    return driver == u"QPSQL" ? driver : QStringLiteral("QODBC");
+}
+
+void ProviderMap::setOdbcDriver(const QString& name)
+{
+    settings().odbcDriver = name;
+}
+
+QString ProviderMap::odbcDriver()
+{
+    if (!settings().odbcDriver.isEmpty())
+        return settings().odbcDriver;
+    const QString fromEnvironment = qEnvironmentVariable("LUDMOX_ODBC_DRIVER");
+    return fromEnvironment.isEmpty() ? QStringLiteral("ODBC Driver 18 for SQL Server")
+                                     : fromEnvironment;
+}
+
+void ProviderMap::addLogon(const ConnectionSpec& spec)
+{
+    settings().logons.push_back(spec);
+}
+
+void ProviderMap::removeLogon(const QString& server, const QString& database, const QString& userId)
+{
+    auto& logons = settings().logons;
+    const ConnectionSpec probe = forServer(server, database, userId, QString(), false);
+    std::erase_if(logons, [&](const ConnectionSpec& s) {
+        return s.hostName.compare(probe.hostName, Qt::CaseInsensitive) == 0 && s.port == probe.port
+            && s.userName.compare(userId, Qt::CaseInsensitive) == 0
+            && (s.databaseName.compare(probe.databaseName, Qt::CaseInsensitive) == 0
+                || s.options.compare(database, Qt::CaseInsensitive) == 0);
+    });
+}
+
+std::optional<ConnectionSpec> ProviderMap::matchingLogon(
+    const QString& server, const QString& database)
+{
+    const ConnectionSpec probe = forServer(server, database, QString(), QString(), true);
+    for (const ConnectionSpec& s : settings().logons) {
+        if (s.driver == probe.driver && s.hostName.compare(probe.hostName, Qt::CaseInsensitive) == 0
+            && s.port == probe.port
+            && (s.databaseName.compare(probe.databaseName, Qt::CaseInsensitive) == 0
+                || s.options.compare(database, Qt::CaseInsensitive) == 0))
+            return s;
+    }
+    return std::nullopt;
+}
+
+void ProviderMap::setMatchLogOnInfo(bool value)
+{
+    settings().matchLogOnInfo = value;
+}
+
+} // namespace reportrt

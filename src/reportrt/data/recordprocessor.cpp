@@ -1,0 +1,204 @@
+#include "reportrt/data/recordprocessor.h"
+
+#include "reportrt/base/invarianttext.h"
+#include "reportrt/formula/formulaevaluator.h"
+
+#include <algorithm>
+#include <numeric>
+
+namespace reportrt {
+
+namespace {
+int compareKeys(const Value& a, const Value& b)
+{
+    if (a.isNull() || b.isNull())
+        return static_cast<int>(!a.isNull()) - static_cast<int>(!b.isNull());
+    return FormulaEvaluator::compare(a, b);
+}
+
+Value fieldValue(const FormulaExpr& e, const Value* record)
+{
+    if (e.kind == FormulaExpr::Kind::Field)
+        return record[e.column];
+    return FormulaEvaluator::evaluate(e, record);
+}
+
+struct Builder {
+    const RecordSet& records;
+    const std::vector<RecordProcessor::Group>& groups;
+    const std::vector<RecordProcessor::Summary>& summaries;
+    const std::vector<Value>& keys; // per record: one per group level, then sorts
+    size_t keyCount;
+    RecordProcessor::Result& result;
+
+    const Value& key(qsizetype record, size_t level) const
+    {
+        return keys[static_cast<size_t>(record) * keyCount + level];
+    }
+
+    void build(size_t level, const qsizetype* begin, const qsizetype* end, int parent)
+    {
+        if (level >= groups.size()) {
+            result.records.insert(result.records.end(), begin, end);
+            return;
+        }
+        struct Run {
+            const qsizetype* begin;
+            const qsizetype* end;
+            Value summary;
+        };
+        std::vector<Run> runs;
+        for (const qsizetype* p = begin; p != end;) {
+            const qsizetype* q = p + 1;
+            while (q != end && compareKeys(key(*p, level), key(*q, level)) == 0)
+                ++q;
+            runs.push_back({ p, q, Value() });
+            p = q;
+        }
+        const RecordProcessor::Group& group = groups[level];
+        if (group.topN > 0 && group.topNSummary >= 0) {
+            const RecordProcessor::Summary& s = summaries[static_cast<size_t>(group.topNSummary)];
+            for (Run& run : runs)
+                run.summary = RecordProcessor::summarize(
+                    s.operation, *s.field, records, run.begin, run.end - run.begin);
+            std::stable_sort(runs.begin(), runs.end(),
+                [](const Run& a, const Run& b) { return compareKeys(a.summary, b.summary) > 0; });
+            if (group.topN < 9999 && runs.size() > static_cast<size_t>(group.topN))
+                runs.resize(static_cast<size_t>(group.topN));
+        }
+        for (const Run& run : runs) {
+            const int index = static_cast<int>(result.groups.size());
+            RecordProcessor::GroupNode node;
+            node.level = static_cast<int>(level) + 1;
+            node.key = key(*run.begin, level);
+            node.parent = parent;
+            node.firstRecord = static_cast<qsizetype>(result.records.size());
+            result.groups.push_back(std::move(node));
+            if (parent >= 0)
+                result.groups[static_cast<size_t>(parent)].children.push_back(index);
+            else
+                result.topGroups.push_back(index);
+            build(level + 1, run.begin, run.end, index);
+            result.groups[static_cast<size_t>(index)].recordCount
+                = static_cast<qsizetype>(result.records.size())
+                - result.groups[static_cast<size_t>(index)].firstRecord;
+        }
+    }
+};
+} // namespace
+
+Value RecordProcessor::summarize(SummaryOperation operation, const FormulaExpr& field,
+    const RecordSet& records, const qsizetype* indexes, qsizetype count)
+{
+    const bool currency = field.type == ValueType::Currency;
+    double sum = 0;
+    int64_t currencySum = 0;
+    bool overflow = false;
+    qsizetype values = 0;
+    Value best;
+    for (qsizetype i = 0; i < count; ++i) {
+        const Value v = fieldValue(field, records.record(indexes[i]));
+        if (v.isNull())
+            continue;
+        ++values;
+        switch (operation) {
+        case SummaryOperation::Sum:
+        case SummaryOperation::Average:
+            if (currency)
+                overflow = overflow
+                    || __builtin_add_overflow(currencySum, v.currencyScaled(), &currencySum);
+            else
+                sum += v.numeric();
+            break;
+        case SummaryOperation::Minimum:
+            if (best.isNull() || FormulaEvaluator::compare(v, best) < 0)
+                best = v;
+            break;
+        case SummaryOperation::Maximum:
+            if (best.isNull() || FormulaEvaluator::compare(v, best) > 0)
+                best = v;
+            break;
+        case SummaryOperation::Count:
+            break;
+        }
+    }
+    if (overflow)
+        throw FormulaException(
+            { QString(), field.position, QStringLiteral("the currency sum overflows") });
+    switch (operation) {
+    case SummaryOperation::Sum:
+        return currency ? Value::currency(currencySum) : Value::number(sum);
+    case SummaryOperation::Average:
+        if (values == 0)
+            return {};
+        if (currency)
+            return Value::currency(*invarianttext::currencyFromDouble(
+                static_cast<double>(currencySum) / 10000.0 / static_cast<double>(values)));
+        return Value::number(sum / static_cast<double>(values));
+    case SummaryOperation::Count:
+        return Value::number(static_cast<double>(values));
+    case SummaryOperation::Minimum:
+    case SummaryOperation::Maximum:
+        return best;
+    }
+    return {};
+}
+
+RecordProcessor::Result RecordProcessor::process(const RecordSet& records,
+    const std::vector<Group>& groups, const std::vector<Sort>& sorts,
+    const std::vector<Summary>& summaries)
+{
+    Result result;
+    const qsizetype count = records.size();
+    const size_t keyCount = groups.size() + sorts.size();
+    std::vector<Value> keys;
+    std::vector<qsizetype> order(static_cast<size_t>(count));
+    std::iota(order.begin(), order.end(), 0);
+    if (keyCount > 0) {
+        keys.resize(static_cast<size_t>(count) * keyCount);
+        for (qsizetype r = 0; r < count; ++r) {
+            const Value* record = records.record(r);
+            for (size_t g = 0; g < groups.size(); ++g)
+                keys[static_cast<size_t>(r) * keyCount + g] = fieldValue(*groups[g].key, record);
+            for (size_t s = 0; s < sorts.size(); ++s)
+                keys[static_cast<size_t>(r) * keyCount + groups.size() + s]
+                    = fieldValue(*sorts[s].key, record);
+        }
+        std::vector<bool> descending;
+        for (const Group& g : groups)
+            descending.push_back(g.order == SortOrder::Descending);
+        for (const Sort& s : sorts)
+            descending.push_back(s.order == SortOrder::Descending);
+        std::stable_sort(order.begin(), order.end(), [&](qsizetype a, qsizetype b) {
+            for (size_t k = 0; k < keyCount; ++k) {
+                int c = compareKeys(keys[static_cast<size_t>(a) * keyCount + k],
+                    keys[static_cast<size_t>(b) * keyCount + k]);
+                if (c != 0)
+                    return descending[k] ? c > 0 : c < 0;
+            }
+            return false;
+        });
+    }
+    Builder builder { records, groups, summaries, keys, keyCount, result };
+    builder.build(0, order.data(), order.data() + order.size(), -1);
+
+    result.totals.resize(summaries.size());
+    for (GroupNode& node : result.groups)
+        node.summaries.resize(summaries.size());
+    for (size_t s = 0; s < summaries.size(); ++s) {
+        const Summary& summary = summaries[s];
+        if (summary.level == 0) {
+            result.totals[s] = summarize(summary.operation, *summary.field, records,
+                result.records.data(), static_cast<qsizetype>(result.records.size()));
+            continue;
+        }
+        for (GroupNode& node : result.groups) {
+            if (node.level == summary.level)
+                node.summaries[s] = summarize(summary.operation, *summary.field, records,
+                    result.records.data() + node.firstRecord, node.recordCount);
+        }
+    }
+    return result;
+}
+
+} // namespace reportrt

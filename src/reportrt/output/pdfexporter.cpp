@@ -1,0 +1,196 @@
+#include "reportrt/output/pdfexporter.h"
+
+#include "reportrt/base/runtimeerror.h"
+#include "reportrt/layout/pagination.h"
+#include "reportrt/output/allocatortuning_p.h"
+#include "reportrt/output/pagerenderer.h"
+#include "reportrt/report.h"
+
+#include <QDir>
+#include <QFileInfo>
+#include <QPageLayout>
+#include <QPainter>
+#include <QPdfWriter>
+#include <QSaveFile>
+#include <condition_variable>
+#include <deque>
+#include <mutex>
+#include <optional>
+#include <thread>
+
+namespace reportrt {
+
+namespace {
+
+/// Pages on their way from the layout to the painting thread. Bounded, so a fast layout
+/// waits for the painter instead of piling pages up.
+class PageQueue {
+public:
+    static constexpr size_t capacity = 4;
+
+    /// False once the painter gave up: the layout should stop.
+    bool push(Page&& page)
+    {
+        std::unique_lock lock(m_mutex);
+        m_changed.wait(lock, [&] { return m_pages.size() < capacity || m_aborted; });
+        if (m_aborted)
+            return false;
+        m_pages.push_back(std::move(page));
+        m_changed.notify_all();
+        return true;
+    }
+
+    /// The next page; nothing once the layout closed the queue or either side aborted.
+    std::optional<Page> pop()
+    {
+        std::unique_lock lock(m_mutex);
+        m_changed.wait(lock, [&] { return !m_pages.empty() || m_closed || m_aborted; });
+        if (m_aborted || m_pages.empty())
+            return std::nullopt;
+        Page page = std::move(m_pages.front());
+        m_pages.pop_front();
+        m_changed.notify_all();
+        return page;
+    }
+
+    void close()
+    {
+        const std::lock_guard lock(m_mutex);
+        m_closed = true;
+        m_changed.notify_all();
+    }
+
+    void abort()
+    {
+        const std::lock_guard lock(m_mutex);
+        m_aborted = true;
+        m_pages.clear();
+        m_changed.notify_all();
+    }
+
+    bool isAborted()
+    {
+        const std::lock_guard lock(m_mutex);
+        return m_aborted;
+    }
+
+private:
+    std::mutex m_mutex;
+    std::condition_variable m_changed;
+    std::deque<Page> m_pages;
+    bool m_closed = false;
+    bool m_aborted = false;
+};
+
+struct Job {
+    QString path;
+    QString title;
+    PageGeometry geometry;
+    const FontTable* fonts = nullptr;
+    PageQueue queue;
+    QString error; // set by the painting thread when it failed
+};
+
+/// The painting thread: everything that touches the file and the PDF writer runs here.
+void paint(Job& job)
+{
+    QSaveFile file(job.path);
+    if (!file.open(QIODevice::WriteOnly)) {
+        job.error = file.errorString();
+        job.queue.abort();
+        return;
+    }
+    QPdfWriter writer(&file);
+    writer.setCreator(QStringLiteral("LUD Mox"));
+    writer.setTitle(job.title);
+    // Twips as device units: the layout's coordinates need no conversion.
+    writer.setResolution(1440);
+    writer.setPageLayout(QPageLayout(
+        QPageSize(QSizeF(job.geometry.width, job.geometry.height) / 20.0, QPageSize::Point),
+        QPageLayout::Portrait, QMarginsF()));
+    QPainter painter;
+    PageRenderer renderer(*job.fonts);
+    bool first = true;
+    while (std::optional<Page> page = job.queue.pop()) {
+        if (first) {
+            if (!painter.begin(&writer)) {
+                job.error = QStringLiteral("the PDF writer could not start");
+                job.queue.abort();
+                file.cancelWriting();
+                return;
+            }
+            first = false;
+        } else if (!writer.newPage()) {
+            job.error = QStringLiteral("the PDF writer could not add a page");
+            job.queue.abort();
+            break;
+        }
+        renderer.paint(painter, *page);
+    }
+    if (painter.isActive())
+        painter.end();
+    if (job.queue.isAborted() || first) {
+        file.cancelWriting();
+        return;
+    }
+    if (!file.commit())
+        job.error = file.errorString();
+}
+
+/// Thrown through the layout when the painting thread stopped.
+struct PainterStopped { };
+
+} // namespace
+
+int PdfExporter::exportTo(Report& report, const QString& path)
+{
+    if (path.trimmed().isEmpty())
+        raiseError(Error::ExportFailed, QStringLiteral("The export has no file name."));
+    const QFileInfo target(path);
+    if (target.isDir())
+        raiseError(Error::ExportFailed,
+            QStringLiteral("Cannot export to %1: it is a folder.")
+                .arg(QDir::toNativeSeparators(path)));
+    if (!target.absoluteDir().exists())
+        raiseError(Error::ExportFailed,
+            QStringLiteral("Cannot export to %1: the folder %2 does not exist.")
+                .arg(QDir::toNativeSeparators(path),
+                    QDir::toNativeSeparators(target.absolutePath())));
+    if (!report.result())
+        report.readRecords();
+
+    tuneAllocatorForPdf();
+    Pagination pagination(report);
+    if (pagination.showsTotalPages())
+        pagination.countPages();
+
+    Job job;
+    job.path = target.absoluteFilePath();
+    job.title = report.title();
+    job.geometry = PageGeometry::of(report.pageSetup());
+    job.fonts = &pagination.fonts();
+    std::thread painter([&job] { paint(job); });
+
+    int pages = 0;
+    try {
+        pages = pagination.run([&job](Page&& page) {
+            if (!job.queue.push(std::move(page)))
+                throw PainterStopped();
+        });
+        job.queue.close();
+    } catch (const PainterStopped&) {
+        job.queue.abort();
+    } catch (...) {
+        job.queue.abort();
+        painter.join();
+        throw;
+    }
+    painter.join();
+    if (!job.error.isEmpty())
+        raiseError(Error::ExportFailed,
+            QStringLiteral("Cannot write the PDF file %1: %2")
+                .arg(QDir::toNativeSeparators(path), job.error));
+    return pages;
+}
+
+} // namespace reportrt
