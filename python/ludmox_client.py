@@ -382,11 +382,20 @@ class Client:
         return [self._decode(item) for item in self._request("enumerate", {"object": obj.handle})["items"]]
 
     def on(self, obj, event_name, handler):
-        """Calls ``handler(event)`` when ``obj`` raises ``event_name`` (connects the object's
-        events on the first registration)."""
-        if not any(handle == obj.handle for handle, _ in self._handlers):
-            self._request("connect", {"object": obj.handle})
-        self._handlers[(obj.handle, event_name.lower())] = (handler, obj)
+        """Calls ``handler(event)`` when ``obj`` raises ``event_name``; the server raises the
+        object's events that have a handler, and no others."""
+        key = (obj.handle, event_name.lower())
+        subscribed = key in self._handlers
+        self._handlers[key] = (handler, obj)
+        if not subscribed:
+            # The server raises only the events the host handles: for some (the parameter
+            # dialog's) the component acts on its own when nobody handles them.
+            names = [name for handle, name in self._handlers if handle == obj.handle]
+            try:
+                self._request("connect", {"object": obj.handle, "events": names})
+            except BaseException:
+                del self._handlers[key]
+                raise
 
     def disconnect(self, obj):
         """Stops the object's events and forgets its handlers."""

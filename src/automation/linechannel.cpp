@@ -5,13 +5,15 @@
 #include <cerrno>
 #include <poll.h>
 #include <unistd.h>
+#include <utility>
 
 namespace automation {
 
-LineChannel::LineChannel(int input, int output, QObject* parent)
+LineChannel::LineChannel(int input, int output, QObject* parent, qsizetype lineLimit)
     : QObject(parent)
     , m_input(input)
     , m_output(output)
+    , m_lineLimit(lineLimit)
     , m_notifier(std::make_unique<QSocketNotifier>(input, QSocketNotifier::Read))
 {
     connect(m_notifier.get(), &QSocketNotifier::activated, this, &LineChannel::readAvailable);
@@ -37,29 +39,47 @@ void LineChannel::readAvailable()
         Q_EMIT inputEnded();
         return;
     }
-    m_partial.append(buffer, count);
-    splitLines();
+    take(QByteArrayView(buffer, count));
 }
 
-void LineChannel::splitLines()
+// Every byte read is looked at once: only the new bytes are searched for line breaks, and
+// the line is appended to (amortised constant time per byte), so a long line costs time in
+// proportion to its length.
+void LineChannel::take(QByteArrayView data)
 {
-    qsizetype newline;
-    while ((newline = m_partial.indexOf('\n')) >= 0) {
-        QByteArray text = m_partial.left(newline);
-        m_partial.remove(0, newline + 1);
-        if (m_discarding) {
-            m_discarding = false;
-            m_lines.push_back({ QByteArray(), true });
-            continue;
+    while (!data.isEmpty()) {
+        const qsizetype newline = data.indexOf('\n');
+        const QByteArrayView piece = newline < 0 ? data : data.first(newline);
+        if (!m_discarding) {
+            // One byte of slack for the CR of a CR LF, which is not part of the line.
+            if (m_partial.size() + piece.size() > m_lineLimit + 1) {
+                m_partial = QByteArray();
+                m_discarding = true;
+            } else {
+                m_partial.append(piece);
+            }
         }
-        if (text.endsWith('\r'))
-            text.chop(1);
+        if (newline < 0)
+            return;
+        finishLine();
+        data = data.sliced(newline + 1);
+    }
+}
+
+void LineChannel::finishLine()
+{
+    if (std::exchange(m_discarding, false)) {
+        m_lines.push_back({ QByteArray(), true });
+        return;
+    }
+    // A fresh buffer for the next line: a long line's memory goes with it.
+    QByteArray text = std::exchange(m_partial, QByteArray());
+    if (text.endsWith('\r'))
+        text.chop(1);
+    if (text.size() > m_lineLimit)
+        m_lines.push_back({ QByteArray(), true });
+    else
         m_lines.push_back({ std::move(text), false });
-    }
-    if (m_partial.size() > maxLineLength) {
-        m_partial.clear();
-        m_discarding = true;
-    }
 }
 
 std::optional<LineChannel::Line> LineChannel::readLine()
@@ -73,15 +93,10 @@ std::optional<LineChannel::Line> LineChannel::readLine()
             return line;
         }
         if (m_inputEnded) {
-            if (m_discarding) {
-                m_discarding = false;
-                return Line { QByteArray(), true };
-            }
-            if (!m_partial.isEmpty()) {
-                Line line { std::exchange(m_partial, QByteArray()), false };
-                if (line.text.endsWith('\r'))
-                    line.text.chop(1);
-                return line;
+            // A final line without a line break.
+            if (m_discarding || !m_partial.isEmpty()) {
+                finishLine();
+                continue;
             }
             return std::nullopt;
         }

@@ -16,12 +16,15 @@ namespace automation {
 class LineChannel : public QObject {
     Q_OBJECT
 public:
-    /// A line longer than this is dropped and reported as one bad line: it bounds what a
-    /// host can make the server buffer.
-    static constexpr qsizetype maxLineLength = 256 * 1024 * 1024;
+    /// The longest line taken, in bytes without its line break (64 MiB). A longer line is
+    /// dropped as soon as it grows past the limit and reported as one bad line once its line
+    /// break arrives; its bytes are never kept, so a host cannot make the server buffer more.
+    static constexpr qsizetype maxLineLength = 64 * 1024 * 1024;
 
     /// Reads from `input` and writes to `output`; neither is closed by the channel.
-    LineChannel(int input, int output, QObject* parent = nullptr);
+    /// `lineLimit` is the longest line taken, in bytes (see maxLineLength).
+    LineChannel(
+        int input, int output, QObject* parent = nullptr, qsizetype lineLimit = maxLineLength);
     ~LineChannel() override;
 
     struct Line {
@@ -39,7 +42,10 @@ public:
     /// Makes every waiting and later readLine() return nothing.
     void stop();
     bool isStopped() const { return m_stopped; }
-    bool atEnd() const { return m_inputEnded && m_lines.empty() && m_partial.isEmpty(); }
+    bool atEnd() const
+    {
+        return m_inputEnded && m_lines.empty() && m_partial.isEmpty() && !m_discarding;
+    }
 
 Q_SIGNALS:
     /// The input has closed. Emitted once, possibly from inside a modal loop that runs while
@@ -48,12 +54,14 @@ Q_SIGNALS:
 
 private:
     void readAvailable();
-    void splitLines();
+    void take(QByteArrayView data);
+    void finishLine();
 
     int m_input;
     int m_output;
+    qsizetype m_lineLimit; // in bytes, without the line break
     std::unique_ptr<QSocketNotifier> m_notifier;
-    QByteArray m_partial;
+    QByteArray m_partial; // the line read so far, only the bytes not yet split off
     bool m_discarding = false; // inside an over-long line
     std::deque<Line> m_lines;
     bool m_inputEnded = false;

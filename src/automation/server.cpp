@@ -14,6 +14,7 @@
 #include <QCborArray>
 #include <QCborMap>
 #include <QLoggingCategory>
+#include <algorithm>
 #include <set>
 #include <unordered_map>
 
@@ -103,6 +104,8 @@ public:
     QCborValue invoke(const QCborMap& params);
     QCborValue enumerate(const QCborMap& params);
     QCborValue connect(const QCborMap& params);
+    std::optional<std::vector<int32_t>> subscribedEvents(
+        const ClassDescription& description, const QCborValue& names);
     QCborValue release(const QCborMap& params);
     core::ObjectPtr requireObject(const QCborMap& params, HandleTable::Handle* handle = nullptr);
 
@@ -357,8 +360,6 @@ QCborValue Server::Private::connect(const QCborMap& params)
 {
     HandleTable::Handle handle = 0;
     const core::ObjectPtr object = requireObject(params, &handle);
-    if (connections.contains(handle))
-        return QCborMap();
     const ClassDescription* description = registry.describe(*object);
     core::EventSource* source = description && !description->eventInterfaceName.isEmpty()
         ? description->eventSource(*object)
@@ -366,12 +367,44 @@ QCborValue Server::Private::connect(const QCborMap& params)
     if (!source)
         throw RpcError { Code::InvalidParams,
             QStringLiteral("Objects of class %1 raise no events").arg(object->className()) };
+    const std::optional<std::vector<int32_t>> events
+        = subscribedEvents(*description, params.value(QStringLiteral("events")));
+    if (const auto found = connections.find(handle); found != connections.end()) {
+        // Connecting again without a list keeps what the host has; with one, the host names
+        // the events it handles now.
+        if (!events)
+            return QCborMap();
+        disconnect(handle);
+    }
     const int cookie = source->connect(
         [this, handle](int32_t dispid, const QString& name, std::span<core::Variant> args) {
             raiseEvent(handle, dispid, name, args);
-        });
+        },
+        events);
     connections[handle] = Connection { source, cookie };
     return QCborMap();
+}
+
+std::optional<std::vector<int32_t>> Server::Private::subscribedEvents(
+    const ClassDescription& description, const QCborValue& names)
+{
+    if (names.isUndefined() || names.isNull())
+        return std::nullopt;
+    if (!names.isArray())
+        throw RpcError { Code::InvalidParams, str("events must be a list of event names") };
+    std::vector<int32_t> dispids;
+    for (const QCborValue& name : names.toArray()) {
+        const auto event = std::find_if(description.events.begin(), description.events.end(),
+            [&name](const EventDescription& e) {
+                return name.isString() && e.name.compare(name.toString(), Qt::CaseInsensitive) == 0;
+            });
+        if (event == description.events.end())
+            throw RpcError { Code::InvalidParams,
+                QStringLiteral("%1 raises no event %2")
+                    .arg(description.name, name.isString() ? name.toString() : str("?")) };
+        dispids.push_back(event->dispid);
+    }
+    return dispids;
 }
 
 void Server::Private::disconnect(HandleTable::Handle handle)

@@ -6,13 +6,24 @@
 
 namespace core {
 
-int EventSource::connect(Handler handler)
+bool EventSource::Connection::takes(int32_t dispid) const
+{
+    return !dispids || std::find(dispids->begin(), dispids->end(), dispid) != dispids->end();
+}
+
+int EventSource::connect(Handler handler, std::optional<std::vector<int32_t>> dispids)
 {
     if (!handler)
         throw ComError::basic(ErrorNumber::InvalidProcedureCall);
     const int cookie = m_nextCookie++;
-    m_handlers.push_back({ cookie, std::move(handler) });
+    m_handlers.push_back({ cookie, std::move(handler), std::move(dispids) });
     return cookie;
+}
+
+bool EventSource::hasHandlerFor(int32_t dispid) const
+{
+    return std::any_of(m_handlers.begin(), m_handlers.end(),
+        [dispid](const Connection& c) { return c.dispids && c.takes(dispid); });
 }
 
 void EventSource::disconnect(int cookie)
@@ -35,7 +46,7 @@ void EventSource::raise(int32_t dispid, const QString& name, std::span<Variant> 
     for (const Connection& connection : connections) {
         if (alive.expired())
             return;
-        if (isConnected(connection.cookie))
+        if (connection.takes(dispid) && isConnected(connection.cookie))
             connection.handler(dispid, name, args);
     }
 }

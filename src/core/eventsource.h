@@ -5,6 +5,7 @@
 #include <QString>
 #include <functional>
 #include <memory>
+#include <optional>
 #include <span>
 #include <vector>
 
@@ -18,10 +19,15 @@ public:
     using Handler
         = std::function<void(int32_t dispid, const QString& name, std::span<Variant> args)>;
 
-    /// Returns a cookie for disconnect.
-    int connect(Handler handler);
+    /// Returns a cookie for disconnect. `dispids` lists the events the handler takes; without
+    /// a list it takes every event of the source.
+    int connect(Handler handler, std::optional<std::vector<int32_t>> dispids = std::nullopt);
     void disconnect(int cookie);
     bool hasHandlers() const { return !m_handlers.empty(); }
+    /// Whether a handler was connected for the event `dispid` by naming it in its list. An
+    /// object may leave a decision to such a handler and take it itself otherwise; handlers
+    /// connected for every event do not count, as they cannot say that they answer it.
+    bool hasHandlerFor(int32_t dispid) const;
 
 protected:
     void raise(int32_t dispid, const QString& name, std::span<Variant> args) const;
@@ -30,6 +36,9 @@ private:
     struct Connection {
         int cookie;
         Handler handler;
+        std::optional<std::vector<int32_t>> dispids; // none: every event
+
+        bool takes(int32_t dispid) const;
     };
     /// Lets raise() notice that a handler destroyed this source; a copy gets its own.
     struct Lifetime {

@@ -1,6 +1,7 @@
 #include "engine/moxglobals.h"
 
 #include "core/text.h"
+#include "platform/tempfolder.h"
 #include "runtime/application.h"
 #include "runtime/applicationfactory.h"
 
@@ -19,7 +20,7 @@ QString gInstanceLogFile;
 
 QString DefaultTraceFile()
 {
-    return QStringLiteral("/ludmox.log");
+    return platform::TempFolder::systemScratchPath(QStringLiteral("c:\\ludmox.log"));
 }
 
 std::shared_ptr<runtime::Application> GetApplication()
@@ -43,7 +44,10 @@ void TraceWrite(const QString& message, const QString& file, bool enabled)
         // time with seconds.
         const QString stamp = core::text::format(
             QDateTime::currentDateTime(), core::text::shortDatePattern() + u" hh:nn:ss");
-        QFile out(file.isEmpty() ? DefaultTraceFile() : file);
+        // A file named the original platform's way ("c:\\trace.log") goes to the private
+        // temporary folder like the default one.
+        QFile out(
+            file.isEmpty() ? DefaultTraceFile() : platform::TempFolder::systemScratchPath(file));
         if (!out.open(QIODevice::WriteOnly | QIODevice::Append))
             return;
         out.write((stamp + u' ' + message + u"\r\n").toUtf8());

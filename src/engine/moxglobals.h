@@ -29,8 +29,10 @@ extern int32_t gEngineCount;
 /// The per-engine trace file in the temporary folder.
 extern QString gInstanceLogFile;
 
-/// The trace file used when TraceWrite is given no file name (the drive-root "c:\ludmox.log"
-/// of the original platform).
+/// The trace file used when TraceWrite is given no file name: the drive-root "c:\\ludmox.log"
+/// of the original platform, which is "ludmox.log" in the private temporary folder
+/// (platform::TempFolder::systemScratchPath). Raises ComError 75 when that folder cannot be
+/// made.
 QString DefaultTraceFile();
 
 /// gApplication, created through runtime::ApplicationFactory first when there is none.

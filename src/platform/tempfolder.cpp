@@ -4,6 +4,7 @@
 
 #include <QDir>
 #include <QFile>
+#include <algorithm>
 #include <cerrno>
 #include <cstring>
 #include <fcntl.h>
@@ -95,6 +96,17 @@ bool ensurePrivate(const QString& folder)
     raiseAccess(folder, EAGAIN);
 }
 
+bool isAsciiLetter(QChar c)
+{
+    return (c >= u'a' && c <= u'z') || (c >= u'A' && c <= u'Z');
+}
+
+const TempFolder& systemFolder()
+{
+    static const TempFolder folder;
+    return folder;
+}
+
 QString makeUniqueFolder(const QString& baseDirectory)
 {
     QByteArray pattern = QFile::encodeName(
@@ -131,8 +143,25 @@ QString TempFolder::path() const
 
 QString TempFolder::systemPath()
 {
-    static const TempFolder folder;
-    return folder.path();
+    return systemFolder().path();
+}
+
+QString TempFolder::scratchPath(const QString& path) const
+{
+    const bool hasDrive = path.size() >= 2 && path.at(1) == u':' && isAsciiLetter(path.at(0));
+    if (!hasDrive && !path.startsWith(u'\\'))
+        return path;
+    QString name = path.mid(hasDrive ? 2 : 0);
+    name = name.mid(std::max(name.lastIndexOf(u'\\'), name.lastIndexOf(u'/')) + 1);
+    // "c:\.." must not climb out of the folder.
+    if (name == u"."_s || name == u".."_s)
+        name.clear();
+    return this->path() + name;
+}
+
+QString TempFolder::systemScratchPath(const QString& path)
+{
+    return systemFolder().scratchPath(path);
 }
 
 } // namespace platform

@@ -25,6 +25,17 @@ public:
     /// path() of the process-wide folder under the system temporary directory.
     static QString systemPath();
 
+    /// Where a trace or scratch file named in the original platform's notation goes. A path
+    /// with a drive ("c:\\ludmox.log", "D:/out.pdf", "c:out.pdf") or one rooted without a
+    /// drive ("\\ludmox.log", a "\\\\server\\share\\" path) has no place on this system;
+    /// it names the file of the same last name in this folder, never the file system's root
+    /// or the current directory. A path that names no file ("c:\\", "c:\\..") gives path().
+    /// Any other path is returned unchanged. Raises what path() raises.
+    QString scratchPath(const QString& path) const;
+
+    /// scratchPath() in the process-wide folder under the system temporary directory.
+    static QString systemScratchPath(const QString& path);
+
 private:
     QString m_baseDirectory;
     mutable QString m_folder; // without the trailing "/"; empty until first used

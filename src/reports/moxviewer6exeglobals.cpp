@@ -8,16 +8,20 @@
 #include "dialogs/inputboxparams.h"
 #include "dialogs/uistrings.h"
 #include "engine/moxengine115.h"
+#include "platform/display.h"
 #include "platform/windowhandles.h"
+#include "reports/moxevents115.h"
 #include "reports/moxreport115.h"
 #include "reports/moxreport115_p.h"
 #include "reports/moxreports115.h"
+#include "reports/reportslogging_p.h"
 #include "runtime/parameterfield.h"
 #include "runtime/parametervaluetype.h"
 
 #include <QDateTime>
 #include <QWidget>
 #include <QWindow>
+#include <optional>
 #include <utility>
 
 using namespace Qt::StringLiterals;
@@ -231,10 +235,58 @@ void writeBack(runtime::ParameterField& parameter, const dialogs::InputBoxParams
     parameter.addCurrentValue(converted);
 }
 
-/// The input dialog, owned by the host's window, shown modally.
+void writeBackAll(const std::vector<std::shared_ptr<runtime::ParameterField>>& parameters,
+    const dialogs::InputBoxParams& answers)
+{
+    for (const auto& item : answers.NewEnum()) {
+        ignoringErrors([&] { writeBack(*parameterNamed(parameters, item->Name), *item); });
+    }
+}
+
+struct HostAnswer {
+    std::shared_ptr<dialogs::InputBoxParams> params;
+    bool cancelled = false;
+};
+
+/// Raises ShowParametersDialogEvent when the host handles it: the host answers in place of
+/// the dialog, through the items' values (as the dialog leaves them after OK) and Cancelled.
+/// Nothing when no handler takes the event.
+std::optional<HostAnswer> askHost(
+    const std::shared_ptr<dialogs::InputBoxParams>& model, MoxReport115* report)
+{
+    if (!report)
+        return std::nullopt;
+    // Held here: a handler may close the report, which releases its event object.
+    const auto events = report->MoxEvents();
+    if (!events->hasHandlerFor(MoxEvents115::ShowParametersDialogEvent))
+        return std::nullopt;
+    core::Variant params { core::ObjectPtr(model) };
+    bool cancelled = false;
+    try {
+        events->ShowParametersDialog(params, cancelled);
+    } catch (const core::ComError& error) {
+        // A handler that fails gave no answer; nothing of the model can be trusted.
+        qCWarning(lcReports) << "the host's parameter dialog failed:" << error.description();
+        return HostAnswer { model, true };
+    }
+    // The host may hand back a field list of its own; anything else leaves the model.
+    std::shared_ptr<dialogs::InputBoxParams> answers = model;
+    ignoringErrors([&] {
+        if (auto own = params.objectAs<dialogs::InputBoxParams>())
+            answers = std::move(own);
+    });
+    return HostAnswer { std::move(answers), cancelled };
+}
+
+/// The input dialog, owned by the host's window, shown modally. Where nobody can answer it
+/// (no display) it is not shown and counts as cancelled, rather than waiting for ever.
 bool showInputBox(const std::shared_ptr<dialogs::InputBoxParams>& params, int32_t buttons,
     const QString& title, int32_t owner)
 {
+    if (!platform::Display::isInteractive()) {
+        qCInfo(lcReports) << "no display to show the parameter dialog on: cancelled";
+        return false;
+    }
     dialogs::frmInputBox form;
     form.HelpContextID = params->HelpId;
     form.ShowBox(params, buttons, title);
@@ -283,6 +335,13 @@ void PromptParameters(const std::vector<std::shared_ptr<runtime::ParameterField>
     if (!anyField)
         return;
 
+    if (const auto answered = askHost(model, Report)) {
+        Cancelled = answered->cancelled;
+        if (!Cancelled)
+            writeBackAll(Parameters, *answered->params);
+        return;
+    }
+
     if (Report) {
         ignoringErrors([&] {
             const auto parent = Report->GetParent();
@@ -295,11 +354,8 @@ void PromptParameters(const std::vector<std::shared_ptr<runtime::ParameterField>
     const bool ok = ShowInputDialog(
         model, okCancel, dialogs::GetUIString(dialogs::UIString::EnterParameterValues));
     Cancelled = !ok;
-    if (!ok)
-        return;
-    for (const auto& item : model->NewEnum()) {
-        ignoringErrors([&] { writeBack(*parameterNamed(Parameters, item->Name), *item); });
-    }
+    if (ok)
+        writeBackAll(Parameters, *model);
 }
 
 bool ShowInputDialog(

@@ -21,18 +21,22 @@ namespace reports {
 
 class MoxReport115;
 
-/// Asks the user for every parameter of `Parameters` that still needs a value and adds the
-/// answers as current values. Shows nothing (and leaves Cancelled alone) when no parameter
-/// needs a value; otherwise Cancelled tells whether the user cancelled. `Report`, when
-/// given, supplies the owner window (its engine's main window). Runtime errors are
-/// skipped statement by statement; nothing is raised.
+/// Asks for every parameter of `Parameters` that still needs a value and adds the answers
+/// as current values. Shows nothing (and leaves Cancelled alone) when no parameter needs a
+/// value; otherwise Cancelled tells whether the answer was cancelled. A host that handles
+/// `Report`'s ShowParametersDialogEvent gets the field list and answers in place of the
+/// dialog (a failing handler counts as cancelled); without such a host the input dialog
+/// asks, and where no display can show it (platform::Display) that counts as cancelled.
+/// `Report`, when given, supplies the owner window (its engine's main window). Runtime
+/// errors are skipped statement by statement; nothing is raised.
 void PromptParameters(const std::vector<std::shared_ptr<runtime::ParameterField>>& Parameters,
     bool& Cancelled, MoxReport115* Report);
 
 /// Shows the input dialog for `Params` modally with the buttons value (1: OK and Cancel)
 /// and title, after taking the date-entry settings from the user's short-date format. An
 /// item named "MDIHandle" gives the owner window and is removed first. True when the user
-/// confirmed; false when cancelled or when the dialog could not be shown.
+/// confirmed; false when cancelled or when the dialog could not be shown (also for want of a
+/// display).
 bool ShowInputDialog(
     const std::shared_ptr<dialogs::InputBoxParams>& Params, int32_t Buttons, const QString& Title);
 

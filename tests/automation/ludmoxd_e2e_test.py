@@ -315,6 +315,37 @@ class EventsTest(unittest.TestCase):
         _, args = self.events.invoke_full("QueryParameters", "LUD#Customer", EMPTY)
         self.assertEqual(args, ["LUD#Customer", EMPTY])
 
+    def test_only_the_events_a_host_names_are_raised_to_it(self):
+        def call(request_id, method, params):
+            self.mox.send_raw(json.dumps(
+                {"jsonrpc": "2.0", "id": request_id, "method": method, "params": params}))
+
+        def invoke(request_id, member, args):
+            call(request_id, "invoke",
+                 {"object": self.events.handle, "member": member, "args": args})
+
+        call(900, "connect", {"object": self.events.handle, "events": ["errorOCCURED"]})
+        self.assertEqual(self.mox.read_message()["id"], 900)
+        # Not named: answered at once, without an event to the host first.
+        invoke(901, "QueryParameters", ["LUD#X", {"$empty": True}])
+        self.assertEqual(self.mox.read_message()["id"], 901)
+        invoke(902, "ErrorOccured", ["named"])
+        event = self.mox.read_message()
+        self.assertEqual((event["method"], event["params"]["name"]), ("event", "ErrorOccured"))
+        self.mox.send_raw(json.dumps({"jsonrpc": "2.0", "id": event["id"], "result": {}}))
+        self.assertEqual(self.mox.read_message()["id"], 902)
+
+        for events in (["NoSuchEvent"], "ErrorOccured", [7]):
+            with self.subTest(events=events):
+                call(903, "connect", {"object": self.events.handle, "events": events})
+                self.assertEqual(self.mox.read_message()["error"]["code"], -32602)
+        # A refused list leaves the subscription as it was.
+        invoke(904, "ErrorOccured", ["still"])
+        event = self.mox.read_message()
+        self.assertEqual(event["method"], "event")
+        self.mox.send_raw(json.dumps({"jsonrpc": "2.0", "id": event["id"], "result": {}}))
+        self.assertEqual(self.mox.read_message()["id"], 904)
+
     def test_a_failing_handler_leaves_arguments_unchanged(self):
         def broken(event):
             event.args[0] = "half done"

@@ -8,27 +8,30 @@
 #include <QTemporaryFile>
 #include <fcntl.h>
 #include <gtest/gtest.h>
+#include <thread>
 #include <unistd.h>
 
 using automation::JsonText;
 
 namespace {
 
-/// Runs a server over a scripted host: every line is written before the server starts (the
-/// answers to events included, since the server numbers its events 1, 2, ...), the input is
-/// then closed and the answers are collected.
+/// Runs a server over a scripted host: every line is written before any answer is read
+/// (the answers to events included, since the server numbers its events 1, 2, ...), the
+/// input is then closed and the answers are collected. A thread writes the lines, so they
+/// may be larger than the pipe.
 class ScriptedHost {
 public:
     std::vector<QCborMap> run(const QList<QByteArray>& lines)
     {
         int input[2];
         EXPECT_EQ(::pipe(input), 0);
-        QByteArray script;
-        for (const QByteArray& line : lines)
-            script += line + '\n';
-        // The whole script fits the pipe: it stays small.
-        EXPECT_EQ(::write(input[1], script.constData(), size_t(script.size())), script.size());
-        ::close(input[1]);
+        std::thread writer([&lines, fd = input[1]] {
+            for (const QByteArray& line : lines) {
+                if (!writeAll(fd, line) || !writeAll(fd, "\n"))
+                    break;
+            }
+            ::close(fd);
+        });
         QTemporaryFile output;
         EXPECT_TRUE(output.open());
         {
@@ -36,6 +39,7 @@ public:
             server.run();
             heldAfterRun = server.heldObjects();
         }
+        writer.join();
         ::close(input[0]);
         output.seek(0);
         std::vector<QCborMap> messages;
@@ -51,6 +55,18 @@ public:
     }
 
     size_t heldAfterRun = 1;
+
+private:
+    static bool writeAll(int fd, QByteArrayView data)
+    {
+        while (!data.isEmpty()) {
+            const ssize_t written = ::write(fd, data.data(), size_t(data.size()));
+            if (written <= 0)
+                return false;
+            data = data.sliced(written);
+        }
+        return true;
+    }
 };
 
 QByteArray request(int id, const char* method, const QByteArray& params = "{}")
@@ -111,6 +127,24 @@ TEST(Server, MalformedInputIsAnsweredAndServingGoesOn)
         automation::DispatchNumber::TypeMismatch);
     EXPECT_EQ(errorOf(messages, 13).value(QStringLiteral("code")).toInteger(), -32602);
     EXPECT_EQ(resultOf(messages, 14)[QStringLiteral("value")].toInteger(), 3);
+}
+
+TEST(Server, AnOverlongLineIsRefusedAndTheNextOneServed)
+{
+    // 200 MB, far over the limit: refused without being kept, and the request after it
+    // still gets its answer.
+    QByteArray huge(200 * 1000 * 1000, 'x');
+    huge.prepend(R"({"jsonrpc":"2.0","id":1,"method":"create","params":{"class":")");
+    ScriptedHost host;
+    const auto messages = host.run({ huge, request(2, "create", R"({"class":"Gadget"})") });
+    huge.clear();
+    ASSERT_EQ(messages.size(), 2u);
+    const QCborMap error = messages[0].value(QStringLiteral("error")).toMap();
+    EXPECT_EQ(error.value(QStringLiteral("code")).toInteger(), -32700);
+    EXPECT_EQ(error.value(QStringLiteral("message")).toString(),
+        QStringLiteral("Parse error: line too long"));
+    EXPECT_TRUE(messages[0].value(QStringLiteral("id")).isNull());
+    EXPECT_EQ(resultOf(messages, 2)[QStringLiteral("object")].toInteger(), 1);
 }
 
 TEST(Server, ComponentErrorsCarryNumberSourceAndDescription)

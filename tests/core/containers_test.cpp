@@ -113,6 +113,7 @@ namespace {
 class Source : public core::EventSource {
 public:
     void fire(std::span<Variant> args) { raise(7, QStringLiteral("Changed"), args); }
+    void fireOther() { raise(8, QStringLiteral("Other"), {}); }
 };
 
 } // namespace
@@ -161,6 +162,30 @@ TEST(EventSource, HandlersMayChangeConnectionsWhileTheEventRuns)
     source.disconnect(added);
     EXPECT_FALSE(source.hasHandlers());
     source.disconnect(12345);
+}
+
+TEST(EventSource, HandlersTakeTheEventsTheyNamed)
+{
+    Source source;
+    std::vector<int32_t> named;
+    std::vector<int32_t> every;
+    source.connect(
+        [&](int32_t dispid, const QString&, std::span<Variant>) { named.push_back(dispid); },
+        std::vector<int32_t> { 8 });
+    source.connect(
+        [&](int32_t dispid, const QString&, std::span<Variant>) { every.push_back(dispid); });
+    source.fire({});
+    source.fireOther();
+    EXPECT_EQ(named, std::vector<int32_t> { 8 });
+    EXPECT_EQ(every, (std::vector<int32_t> { 7, 8 }));
+    // Only a handler that named the event answers for it; one for every event may not.
+    EXPECT_TRUE(source.hasHandlerFor(8));
+    EXPECT_FALSE(source.hasHandlerFor(7));
+
+    Source none;
+    none.connect([](int32_t, const QString&, std::span<Variant>) {}, std::vector<int32_t> {});
+    EXPECT_TRUE(none.hasHandlers());
+    EXPECT_FALSE(none.hasHandlerFor(7)) << "an empty list takes nothing";
 }
 
 TEST(EventSource, AHandlerMayDestroyTheSource)

@@ -1,4 +1,5 @@
 #include "enginetest.h"
+#include "platform/tempfolder.h"
 
 #include <QFile>
 #include <QRegularExpression>
@@ -43,6 +44,28 @@ TEST(TraceWrite, UnwritableFileLosesTheLineQuietly)
     const QString path = folder.filePath(u"missing/trace.log"_s);
     engine::TraceWrite(u"lost"_s, path, true);
     EXPECT_FALSE(QFile::exists(path));
+}
+
+TEST(TraceWrite, TheDefaultFileIsInThePrivateTemporaryFolder)
+{
+    // "c:\\ludmox.log" names the drive's root; here that is the private temporary folder,
+    // never the file system's root or the current directory.
+    const QString expected = platform::TempFolder::systemPath() + u"ludmox.log"_s;
+    EXPECT_EQ(engine::DefaultTraceFile(), expected);
+    const bool rootHadOne = QFile::exists(u"/ludmox.log"_s);
+    const bool hereHadOne = QFile::exists(u"c:\\ludmox.log"_s);
+    QFile::remove(expected);
+
+    engine::TraceWrite(u"default file"_s, QString(), true);
+    engine::TraceWrite(u"named the old way"_s, u"c:\\ludmox.log"_s, true);
+
+    const QStringList lines = contents(expected).split(u"\r\n"_s);
+    QFile::remove(expected);
+    ASSERT_EQ(lines.size(), 3);
+    EXPECT_TRUE(lines[0].endsWith(u" default file"_s));
+    EXPECT_TRUE(lines[1].endsWith(u" named the old way"_s));
+    EXPECT_EQ(QFile::exists(u"/ludmox.log"_s), rootHadOne);
+    EXPECT_EQ(QFile::exists(u"c:\\ludmox.log"_s), hereHadOne);
 }
 
 } // namespace

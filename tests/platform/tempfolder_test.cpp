@@ -164,4 +164,43 @@ TEST(TempFolder, MissingBaseDirectoryRaisesPathFileAccess)
     }
 }
 
+TEST(TempFolder, PathsOfTheOriginalPlatformMapIntoTheFolder)
+{
+    QTemporaryDir base;
+    const platform::TempFolder folder(base.path());
+    const QString inside = preferredFolder(base) + u'/';
+    const struct {
+        const char* name;
+        QString given;
+        QString expected; // in the folder; the same as `given` when the path is kept
+    } cases[] = {
+        { "drive root", u"c:\\ludmox.log"_s, u"ludmox.log"_s },
+        { "upper-case drive, forward slash", u"D:/out.pdf"_s, u"out.pdf"_s },
+        { "drive without a separator", u"c:scratch.tmp"_s, u"scratch.tmp"_s },
+        { "folders on a drive", u"c:\\temp\\sub/report.xls"_s, u"report.xls"_s },
+        { "rooted without a drive", u"\\ludmox.log"_s, u"ludmox.log"_s },
+        { "share", u"\\\\server\\share\\mail.eml"_s, u"mail.eml"_s },
+        { "the root itself", u"c:\\"_s, QString() },
+        // Must not climb out of the private folder.
+        { "parent folder", u"c:\\.."_s, QString() },
+        { "current folder", u"\\."_s, QString() },
+        { "a path of this system", u"/var/tmp/x.log"_s, u"/var/tmp/x.log"_s },
+        { "a relative path", u"trace.log"_s, u"trace.log"_s },
+        { "a digit is no drive", u"1:\\x.log"_s, u"1:\\x.log"_s },
+    };
+    for (const auto& c : cases) {
+        SCOPED_TRACE(c.name);
+        const bool unchanged = c.expected == c.given;
+        EXPECT_EQ(folder.scratchPath(c.given), unchanged ? c.given : inside + c.expected);
+    }
+    expectPrivate(inside);
+}
+
+TEST(TempFolder, TheProcessFolderTakesTheDefaultTraceFile)
+{
+    const QString path = platform::TempFolder::systemScratchPath(u"c:\\ludmox.log"_s);
+    EXPECT_EQ(path, platform::TempFolder::systemPath() + u"ludmox.log"_s);
+    EXPECT_FALSE(path.startsWith(u"/ludmox"_s));
+}
+
 } // namespace

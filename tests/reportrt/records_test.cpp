@@ -1,6 +1,7 @@
 #include "core/comerror.h"
 #include "reportrt/application.h"
 #include "reportrt/base/runtimeerror.h"
+#include "reportrt/data/providermap.h"
 #include "reportrt/output/registerruntime.h"
 #include "reportrt/report.h"
 #include "reportrttest.h"
@@ -8,6 +9,7 @@
 #include "runtime/databasetable.h"
 #include "runtime/parameterfield.h"
 
+#include <QDir>
 #include <QFile>
 #include <QJsonDocument>
 #include <gtest/gtest.h>
@@ -323,6 +325,83 @@ TEST_F(Records, LocationsThatCannotBeReachedRaiseTheConnectionError)
         table->setLocation(QStringLiteral("Suppliers"), QString(), QString()), core::ComError);
     table->setLocation(QStringLiteral("Orders"), QString(), QString());
     EXPECT_EQ(table->location(), u"Orders");
+}
+
+// What failed is named: the file, and whether it is missing or of another kind. A Jet
+// logon passes the file as the server name, which must not turn into an ODBC connection.
+TEST_F(Records, DataSourcesThatAreNoDatabaseNameTheFileAndTheCause)
+{
+    QFile text(m_dir.filePath(u"notes.txt"_s));
+    ASSERT_TRUE(text.open(QIODevice::WriteOnly));
+    text.write(QByteArray("These are notes, not a database.\n").repeated(40));
+    text.close();
+    const QString missing = m_dir.filePath(u"gone/shop.db"_s);
+    const struct {
+        const char* name;
+        QString file;
+        const char16_t* cause;
+        bool asServer; // a folder is no server name of a file (a socket folder may be one)
+    } cases[] = {
+        { "a text file", text.fileName(), u"is not a SQLite database", true },
+        { "a missing file", missing, u"does not exist", true },
+        { "a folder", m_dir.path(), u"not a file", false },
+    };
+    registerRuntime();
+    const auto application = runtime::ApplicationFactory::create();
+    for (const auto& c : cases) {
+        SCOPED_TRACE(c.name);
+        const auto report = open(shopReport(), false);
+        const auto table = report->databaseTables()[0];
+        table->deleteConnectionProperties();
+        table->addConnectionProperty(u"Provider"_s, core::Variant(u"Microsoft.Jet.OLEDB.4.0"_s));
+        table->addConnectionProperty(u"Data Source"_s, core::Variant(c.file));
+        try {
+            table->setLocation(u"Orders"_s, QString(), QString());
+            ADD_FAILURE() << "the table was located";
+        } catch (const core::ComError& error) {
+            EXPECT_EQ(error.number(), core::ErrorNumber::TableConnectionFailed);
+            EXPECT_TRUE(error.description().contains(c.file)) << error.description().toStdString();
+            EXPECT_TRUE(error.description().contains(QStringView(c.cause)))
+                << error.description().toStdString();
+        }
+        if (!c.asServer)
+            continue;
+        try {
+            application->logOnServer(u"PDSOLEDB.DLL"_s, c.file, u"shop"_s, u"admin"_s, QString(),
+                u"SQLOLEDB"_s, QString());
+            ADD_FAILURE() << "logged on";
+        } catch (const core::ComError& error) {
+            EXPECT_EQ(error.number(), core::ErrorNumber::LogOnFailed);
+            EXPECT_TRUE(error.description().contains(c.file)) << error.description().toStdString();
+            EXPECT_TRUE(error.description().contains(QStringView(c.cause)))
+                << error.description().toStdString();
+            EXPECT_FALSE(error.description().contains(u"ODBC"_s))
+                << error.description().toStdString();
+        }
+    }
+    EXPECT_FALSE(QFile::exists(missing)) << "no empty database made";
+}
+
+TEST(ProviderMap, ServerNamesThatAreDatabaseFiles)
+{
+    const struct {
+        const char* name;
+        QString server;
+        bool isFile;
+    } cases[] = {
+        { "a missing path", u"/data/none/shop.db"_s, true },
+        { "a Jet file of the original platform", u"C:\\Data\\Shop.MDB"_s, true },
+        { "a relative path", u"data/shop"_s, true },
+        { "a host", u"dbserver"_s, false },
+        { "a host and port", u"10.0.0.5,1433"_s, false },
+        { "a named instance", u"dbserver\\SQLEXPRESS"_s, false },
+        { "a socket folder", QDir::tempPath(), false },
+    };
+    for (const auto& c : cases) {
+        SCOPED_TRACE(c.name);
+        const ConnectionSpec spec = ProviderMap::forServer(c.server, u"shop"_s, u"sa"_s, {}, false);
+        EXPECT_EQ(spec.driver == u"QSQLITE", c.isFile) << spec.driver.toStdString();
+    }
 }
 
 TEST_F(Records, BadValuesAndFormulaFailuresAreReportedWithTheRecord)

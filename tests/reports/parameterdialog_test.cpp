@@ -1,6 +1,7 @@
 // The report's parameter dialog shown for real (offscreen) and answered with the mouse.
 
 #include "dialogs/frminputbox.h"
+#include "platform/display.h"
 #include "reporttest.h"
 
 #include <QApplication>
@@ -50,8 +51,9 @@ protected:
     void SetUp() override
     {
         ReportTest::SetUp();
-        // The real dialog, not the scripted one.
+        // The real dialog, not the scripted one, answered offscreen by simulated input.
         reports::SetInputBoxPresenter(nullptr);
+        previousDisplay = platform::Display::setInteractiveOverride(true);
         file = addOrdersReport();
         customer = addParameter(*file, Param(u"Customer"_s).prompt(u"Which customer?"_s));
         size = addParameter(*file,
@@ -63,7 +65,13 @@ protected:
         paid = addParameter(*file, Param(u"Paid"_s).type(9));
         report = open();
     }
+    void TearDown() override
+    {
+        platform::Display::setInteractiveOverride(previousDisplay);
+        ReportTest::TearDown();
+    }
 
+    std::optional<bool> previousDisplay;
     std::shared_ptr<fakeruntime::FakeReport> file;
     std::shared_ptr<fakeruntime::FakeParameterField> customer;
     std::shared_ptr<fakeruntime::FakeParameterField> size;
@@ -107,6 +115,36 @@ TEST_F(ParameterDialogWidget, CancelRaisesUserCancelled)
         EXPECT_EQ(error.number(), UserCancelled);
         EXPECT_EQ(error.description(), u"User Cancelled"_s);
     }
+    EXPECT_TRUE(report->UnloadRequest());
+    EXPECT_TRUE(customer->state.currentValues.empty());
+}
+
+TEST_F(ParameterDialogWidget, WithoutADisplayOrAHostItCountsAsCancelled)
+{
+    // What the platform finds out for itself: these tests run offscreen, where nobody could
+    // answer a modal dialog.
+    platform::Display::setInteractiveOverride(std::nullopt);
+    ASSERT_FALSE(platform::Display::isInteractive());
+    // Lives only as long as this test: a dialog that shows is closed, so the test fails
+    // instead of hanging.
+    bool shown = false;
+    QTimer watchdog;
+    watchdog.setInterval(10);
+    QObject::connect(&watchdog, &QTimer::timeout, [&shown] {
+        if (auto* box = qobject_cast<dialogs::frmInputBox*>(QApplication::activeModalWidget())) {
+            shown = true;
+            box->reject();
+        }
+    });
+    watchdog.start();
+    try {
+        report->C_Report();
+        FAIL() << "expected User Cancelled";
+    } catch (const core::ComError& error) {
+        EXPECT_EQ(error.number(), UserCancelled);
+        EXPECT_EQ(error.description(), u"User Cancelled"_s);
+    }
+    EXPECT_FALSE(shown) << "a dialog nobody can see was shown";
     EXPECT_TRUE(report->UnloadRequest());
     EXPECT_TRUE(customer->state.currentValues.empty());
 }

@@ -372,6 +372,158 @@ TEST_F(ReportParameters, CancellingTheDialogRaisesUserCancelled)
     EXPECT_FALSE(report->UnloadRequest());
 }
 
+/// The report's parameter dialog event, handled by the host: `answer` sees the field list
+/// and may set Cancelled; the handler names the event, as a host that answers it does.
+class HostParameterDialog : public ReportParameters {
+protected:
+    void SetUp() override
+    {
+        ReportParameters::SetUp();
+        customer = parameter(Param(u"Customer"_s));
+        size = parameter(Param(u"Size"_s)
+                             .type(5)
+                             .listedOnly()
+                             .entry(int32_t(1), u"Small"_s)
+                             .entry(int32_t(3), u"Large"_s));
+        paid = parameter(Param(u"Paid"_s).type(9));
+        moxEngine->Init(3, false, 0, 4242);
+    }
+
+    void handleDialogEvent(
+        std::function<void(core::Variant& params, core::Variant& cancelled)> answer)
+    {
+        report->MoxEvents()->connect(
+            [this, answer](int32_t, const QString&, std::span<core::Variant> args) {
+                ++raised;
+                answer(args[0], args[1]);
+            },
+            std::vector<int32_t> { reports::MoxEvents115::ShowParametersDialogEvent });
+    }
+
+    static void fill(dialogs::InputBoxParams& params)
+    {
+        params.Item(u"Customer"_s)->Value = u"ACME"_s;
+        params.Item(u"Size"_s)->Value = u"Large"_s;
+        params.Item(u"Paid"_s)->Value = u"1"_s;
+    }
+
+    void expectUserCancelled()
+    {
+        try {
+            report->C_Report();
+            ADD_FAILURE() << "expected User Cancelled";
+        } catch (const core::ComError& error) {
+            EXPECT_EQ(error.number(), UserCancelled);
+            EXPECT_EQ(error.description(), u"User Cancelled"_s);
+        }
+        EXPECT_TRUE(report->UnloadRequest());
+        EXPECT_TRUE(customer->state.currentValues.empty());
+        EXPECT_TRUE(paid->state.currentValues.empty());
+    }
+
+    std::shared_ptr<FakeParameterField> customer;
+    std::shared_ptr<FakeParameterField> size;
+    std::shared_ptr<FakeParameterField> paid;
+    int raised = 0;
+};
+
+TEST_F(HostParameterDialog, TheHostsAnswersBecomeTheParametersValues)
+{
+    QStringList names;
+    handleDialogEvent([&](core::Variant& params, core::Variant&) {
+        const auto list = params.objectAs<dialogs::InputBoxParams>();
+        ASSERT_NE(list, nullptr);
+        for (const auto& item : list->NewEnum())
+            names << item->Name;
+        fill(*list);
+    });
+
+    ASSERT_EQ(report->C_Report(), file);
+    EXPECT_EQ(raised, 1);
+    EXPECT_EQ(dialog.shown, 0) << "the host answered instead of the dialog";
+    // The owner window is the dialog's business and never reaches the host.
+    EXPECT_EQ(names, (QStringList { u"Customer"_s, u"Size"_s, u"Paid"_s }));
+    EXPECT_EQ(customer->state.currentValues, std::vector<core::Variant> { u"ACME"_s });
+    EXPECT_EQ(size->state.currentValues, std::vector<core::Variant> { int32_t(3) })
+        << "the chosen description stands for its value";
+    EXPECT_EQ(paid->state.currentValues, std::vector<core::Variant> { true });
+    EXPECT_FALSE(report->UnloadRequest());
+
+    // Kept like dialog answers: the next run asks nobody.
+    bool cancelled = false;
+    report->SetParameters(cancelled, false);
+    EXPECT_EQ(raised, 1);
+}
+
+TEST_F(HostParameterDialog, AListOfTheHostsOwnIsRead)
+{
+    handleDialogEvent([](core::Variant& params, core::Variant&) {
+        auto own = std::make_shared<dialogs::InputBoxParams>();
+        fill(*own);
+        own->Item(u"Customer"_s)->Value = u"Own"_s;
+        params = core::ObjectPtr(own);
+    });
+    ASSERT_EQ(report->C_Report(), file);
+    EXPECT_EQ(customer->state.currentValues, std::vector<core::Variant> { u"Own"_s });
+}
+
+TEST_F(HostParameterDialog, AHostThatCancelsOrFailsCancels)
+{
+    const struct {
+        const char* name;
+        std::function<void(core::Variant&, core::Variant&)> answer;
+    } cases[] = {
+        { "Cancelled set",
+            [](core::Variant& params, core::Variant& cancelled) {
+                fill(*params.objectAs<dialogs::InputBoxParams>());
+                cancelled = true;
+            } },
+        // A failed handler answered nothing; its half-filled list must not become values.
+        { "handler raises",
+            [](core::Variant& params, core::Variant&) {
+                fill(*params.objectAs<dialogs::InputBoxParams>());
+                throw core::ComError(5, u"Host"_s, u"broken"_s);
+            } },
+    };
+    for (const auto& c : cases) {
+        SCOPED_TRACE(c.name);
+        // A fresh report object each time: the last one's events keep their handler.
+        collection->Remove(u"orders.rpt"_s);
+        report = open();
+        raised = 0;
+        handleDialogEvent(c.answer);
+        expectUserCancelled();
+        EXPECT_EQ(raised, 1);
+        EXPECT_EQ(dialog.shown, 0);
+    }
+}
+
+TEST_F(HostParameterDialog, HandlersThatDoNotNameTheEventLeaveItToTheDialog)
+{
+    // A handler for every event and one for QueryParameters only: neither says it answers
+    // the dialog, so the dialog asks and the event is not raised.
+    recordEvents(*report);
+    int queried = 0;
+    report->MoxEvents()->connect(
+        [&](int32_t, const QString&, std::span<core::Variant>) { ++queried; },
+        std::vector<int32_t> { reports::MoxEvents115::QueryParametersEvent });
+    answerDialog({ { u"Customer"_s, u"ACME"_s } });
+
+    ASSERT_EQ(report->C_Report(), file);
+    EXPECT_EQ(dialog.shown, 1);
+    EXPECT_TRUE(events.empty()) << events.front().name.toStdString();
+    EXPECT_EQ(customer->state.currentValues, std::vector<core::Variant> { u"ACME"_s });
+}
+
+TEST_F(HostParameterDialog, NoParameterNeedingAValueRaisesNothing)
+{
+    handleDialogEvent([](core::Variant&, core::Variant&) {});
+    report->SetParams(
+        dictionary({ { u"Customer"_s, u"A"_s }, { u"Size"_s, int32_t(1) }, { u"Paid"_s, false } }));
+    ASSERT_EQ(report->C_Report(), file);
+    EXPECT_EQ(raised, 0);
+}
+
 TEST_F(ReportParameters, SetParamsReappliesToAnOpenReport)
 {
     auto customer = parameter(Param(u"Customer"_s));

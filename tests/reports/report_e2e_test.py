@@ -10,6 +10,7 @@ import os
 import sqlite3
 import subprocess
 import tempfile
+import threading
 import unittest
 
 from ludmox_client import Array2D, Client, ComError
@@ -165,6 +166,72 @@ class ReportThroughLudmoxd(unittest.TestCase):
             report.GetParamsCollection()
         self.assertEqual(raised.exception.number, USER_CANCELLED)
         self.assertEqual(raised.exception.source, "LUD Crystal Engine")
+
+
+class ParameterDialogOfAHeadlessServer(unittest.TestCase):
+    """ludmoxd runs offscreen here: nobody can see or answer the parameter dialog."""
+
+    def setUp(self):
+        self.folder = tempfile.TemporaryDirectory()
+        self.addCleanup(self.folder.cleanup)
+        database = os.path.join(self.folder.name, "shop.db")
+        make_database(database)
+        env = dict(os.environ, QT_QPA_PLATFORM="offscreen")
+        self.mox = Client(env=env, stderr=subprocess.DEVNULL)
+        self.addCleanup(self.mox.close)
+        # A server that waits on a dialog would never answer: end it so the test fails
+        # instead of hanging.
+        watchdog = threading.Timer(60, self.mox.process.kill)
+        watchdog.start()
+        self.addCleanup(watchdog.cancel)
+        self.engine = self.mox.create("MoxEngine115")
+        self.engine.Init(3, False, 0, 0)
+        self.engine.SetLogonInfo(ECST_MSJET, database, "", "admin", "")
+        # Held: a report reaches its engine through its collection.
+        self.reports = self.engine.GetReports()
+        document = report_document("{Orders.Status} = {?Status}")
+        # Used by the selection and without a value: the dialog would ask for it.
+        document["parameters"] = [{"name": "Status", "prompt": "Which status?", "valueType": 12}]
+        path = os.path.join(self.folder.name, "orders.rpt")
+        with open(path, "w", encoding="utf-8") as file:
+            json.dump(document, file)
+        self.report = self.reports.Item(path)
+
+    def test_without_a_handler_the_dialog_counts_as_cancelled(self):
+        # A handler for another event does not answer the dialog.
+        self.mox.on(self.report.MoxEvents, "QueryParameters", lambda event: None)
+        with self.assertRaises(ComError) as raised:
+            self.report.C_Report
+        self.assertEqual(raised.exception.number, USER_CANCELLED)
+        self.assertEqual(raised.exception.description, "User Cancelled")
+        self.assertTrue(self.report.UnloadRequest)
+
+    def test_a_handler_answers_with_the_hosts_own_values(self):
+        shown = []
+
+        def answer(event):
+            params, cancelled = event.args
+            shown.append((params.Count(), cancelled))
+            item = params.Item("Status")
+            shown.append(item.LabelToolTip())
+            item.Value = "open"
+
+        self.mox.on(self.report.MoxEvents, "ShowParametersDialogEvent", answer)
+        statement = self.report.C_Report.SQLQueryString.get()
+        self.assertEqual(shown, [(1, False), "Which status?"])
+        self.assertFalse(self.report.UnloadRequest)
+        self.assertIn("'open'", statement)
+        # Answered once: the next run keeps the host's values and asks nobody.
+        self.assertIsNone(self.report.SetParameters())
+        self.assertEqual(len(shown), 2)
+
+    def test_a_handler_that_cancels_cancels(self):
+        self.mox.on(self.report.MoxEvents, "ShowParametersDialogEvent",
+                    lambda event: event.args.__setitem__(1, True))
+        with self.assertRaises(ComError) as raised:
+            self.report.C_Report
+        self.assertEqual(raised.exception.number, USER_CANCELLED)
+        self.assertTrue(self.report.UnloadRequest)
 
 
 if __name__ == "__main__":

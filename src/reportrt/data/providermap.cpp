@@ -92,6 +92,29 @@ ConnectionSpec fileDatabase(const QString& path)
     return spec;
 }
 
+/// A Jet logon names its database file as the server. A name with a "/" (a host name has
+/// none) or a database file's extension is taken for such a file even when it is missing,
+/// so that the error names the file and not a server driver nobody meant to use. Host
+/// names with "\" (a server's named instance) are not files.
+bool namesDatabaseFile(const QString& server)
+{
+    if (server.isEmpty())
+        return false;
+    const QFileInfo file(server);
+    if (file.isFile())
+        return true;
+    if (file.isDir())
+        return false;
+    if (server.contains(u'/'))
+        return true;
+    for (const char16_t* extension :
+        { u".db", u".db3", u".sqlite", u".sqlite3", u".mdb", u".accdb" }) {
+        if (server.endsWith(QStringView(extension), Qt::CaseInsensitive))
+            return true;
+    }
+    return false;
+}
+
 /// ODBC connect-string values with ";" or braces are written in braces.
 QString odbcValue(const QString& value)
 {
@@ -126,8 +149,7 @@ QString ConnectionSpec::key() const
 ConnectionSpec ProviderMap::forServer(const QString& server, const QString& database,
     const QString& userId, const QString& password, bool integratedSecurity)
 {
-    const QFileInfo file(server);
-    if (!server.isEmpty() && file.isFile())
+    if (namesDatabaseFile(server))
         return fileDatabase(server);
     ConnectionSpec spec;
     spec.driver = serverDriver();
@@ -187,9 +209,10 @@ ConnectionSpec ProviderMap::fromProperties(const std::vector<ConnectionProperty>
                 QStringLiteral("Failed to open the connection: the table has no \"Data Source\"."));
         if (!QFileInfo(path).isFile())
             raiseError(Error::TableConnectionFailed,
-                QStringLiteral(
-                    "Failed to open the connection: the database file %1 does not exist.")
-                    .arg(path));
+                QStringLiteral("Failed to open the connection: the database file %1 %2.")
+                    .arg(path,
+                        QFileInfo::exists(path) ? QStringLiteral("is not a file")
+                                                : QStringLiteral("does not exist")));
         return fileDatabase(path);
     }
     if (isSqlServer(provider)) {

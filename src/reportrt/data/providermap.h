@@ -45,8 +45,9 @@ public:
     /// Raises Error::TableConnectionFailed when the properties name no known provider or
     /// lack the data source.
     static ConnectionSpec fromProperties(const std::vector<ConnectionProperty>& properties);
-    /// The server logon. A server name that is the path of an existing file is a database
-    /// file: the engine passes a Jet database file as the server name.
+    /// The server logon. A server name that is the path of a file, or looks like one (a "/"
+    /// or a database file's extension), is a database file: the engine passes a Jet database
+    /// file as the server name.
     static ConnectionSpec forServer(const QString& server, const QString& database,
         const QString& userId, const QString& password, bool integratedSecurity);
 

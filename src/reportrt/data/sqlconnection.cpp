@@ -1,6 +1,8 @@
 #include "reportrt/data/sqlconnection.h"
 
+#include <QFileInfo>
 #include <QSqlError>
+#include <QSqlQuery>
 #include <atomic>
 
 namespace reportrt {
@@ -10,6 +12,18 @@ QString uniqueName()
 {
     static std::atomic<int> counter { 0 };
     return QStringLiteral("ludmox-reportrt-%1").arg(++counter);
+}
+
+// SQLite opens any file and finds out what it is only when it first reads it; reading the
+// header now makes a file of another kind fail here, named, and not in the first query.
+bool isSqliteDatabase(const QSqlDatabase& db, QString& message)
+{
+    QSqlQuery probe(db);
+    if (probe.exec(QStringLiteral("PRAGMA schema_version")))
+        return true;
+    message = QStringLiteral("the file is not a SQLite database (%1)")
+                  .arg(probe.lastError().databaseText());
+    return false;
 }
 } // namespace
 
@@ -31,6 +45,13 @@ SqlConnection::~SqlConnection()
 
 bool SqlConnection::open(QString& message)
 {
+    const bool isFile = m_spec.driver == u"QSQLITE";
+    if (isFile && !QFileInfo(m_spec.databaseName).isFile()) {
+        message = QFileInfo::exists(m_spec.databaseName)
+            ? QStringLiteral("it is not a file")
+            : QStringLiteral("the file does not exist");
+        return false;
+    }
     if (!QSqlDatabase::isDriverAvailable(m_spec.driver)) {
         message = QStringLiteral("the database driver %1 is not installed").arg(m_spec.driver);
         return false;
@@ -47,8 +68,12 @@ bool SqlConnection::open(QString& message)
     db.setPassword(m_spec.password);
     if (m_spec.driver != u"QODBC")
         db.setConnectOptions(m_spec.options);
-    if (db.open())
-        return true;
+    if (db.open()) {
+        if (!isFile || isSqliteDatabase(db, message))
+            return true;
+        db.close();
+        return false;
+    }
     QString text = db.lastError().text();
     // Drivers may echo the connect string; never let a password through.
     if (!m_spec.password.isEmpty())

@@ -16,7 +16,8 @@ public:
     SqlConnection(const SqlConnection&) = delete;
     SqlConnection& operator=(const SqlConnection&) = delete;
 
-    /// Opens the connection; on failure returns false with a message (no password in it).
+    /// Opens the connection; on failure returns false with a message (no password in it)
+    /// that completes spec().describe(). A database file must exist and be a SQLite database.
     bool open(QString& message);
     QSqlDatabase database() const;
     const ConnectionSpec& spec() const { return m_spec; }

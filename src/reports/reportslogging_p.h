@@ -1,0 +1,7 @@
+#pragma once
+
+#include <QLoggingCategory>
+
+namespace reports {
+Q_DECLARE_LOGGING_CATEGORY(lcReports)
+}
