@@ -1,12 +1,13 @@
 #include "documentwriter.h"
 
+#include "durablefile_p.h"
 #include "runtimeerror.h"
 #include "valuecodec.h"
 
+#include <QDir>
 #include <QJsonArray>
 #include <QJsonDocument>
 #include <QJsonObject>
-#include <QSaveFile>
 
 using namespace Qt::StringLiterals;
 
@@ -303,11 +304,11 @@ void DocumentWriter::writeFile(
     const ReportDocument& document, const QString& path, bool withSavedData)
 {
     const QByteArray data = serialize(document, withSavedData);
-    QSaveFile file(path);
-    if (!file.open(QIODevice::WriteOnly))
-        raiseError(Error::SaveFailed, QStringLiteral("%1: %2").arg(path, file.errorString()));
-    if (file.write(data) != data.size() || !file.commit())
-        raiseError(Error::SaveFailed, QStringLiteral("%1: %2").arg(path, file.errorString()));
+    DurableFile file(path);
+    if (!file.start() || file.write(data) != data.size() || !file.finish())
+        raiseError(Error::SaveFailed,
+            QStringLiteral("Cannot save the report to %1: %2")
+                .arg(QDir::toNativeSeparators(path), file.failure()));
 }
 
 } // namespace reportrt

@@ -1,6 +1,7 @@
 #include "pdfexporter.h"
 
 #include "allocatortuning_p.h"
+#include "durablefile_p.h"
 #include "fonttable.h"
 #include "layoutengine.h"
 #include "pagerenderer.h"
@@ -13,7 +14,6 @@
 #include <QPageLayout>
 #include <QPainter>
 #include <QPdfWriter>
-#include <QSaveFile>
 #include <condition_variable>
 #include <deque>
 #include <mutex>
@@ -96,9 +96,9 @@ struct Job {
 /// The painting thread: everything that touches the file and the PDF writer runs here.
 void paint(Job& job)
 {
-    QSaveFile file(job.path);
-    if (!file.open(QIODevice::WriteOnly)) {
-        job.error = file.errorString();
+    DurableFile file(job.path);
+    if (!file.start()) {
+        job.error = file.failure();
         job.queue.abort();
         return;
     }
@@ -118,7 +118,7 @@ void paint(Job& job)
             if (!painter.begin(&writer)) {
                 job.error = QStringLiteral("the PDF writer could not start");
                 job.queue.abort();
-                file.cancelWriting();
+                file.abandon();
                 return;
             }
             first = false;
@@ -132,11 +132,11 @@ void paint(Job& job)
     if (painter.isActive())
         painter.end();
     if (job.queue.isAborted() || first) {
-        file.cancelWriting();
+        file.abandon();
         return;
     }
-    if (!file.commit())
-        job.error = file.errorString();
+    if (!file.finish())
+        job.error = file.failure();
 }
 
 /// Thrown through the layout when the painting thread stopped.
