@@ -100,8 +100,8 @@ std::vector<const FormulaExpr*> FormulaCompiler::conjuncts(const FormulaExpr* fo
         const FormulaExpr* e = stack.back();
         stack.pop_back();
         if (e->kind == Kind::And) {
-            stack.push_back(e->children[1].get());
-            stack.push_back(e->children[0].get());
+            for (auto child = e->children.rbegin(); child != e->children.rend(); ++child)
+                stack.push_back(child->get());
         } else if (e->kind == Kind::Formula && e->body && e->body->kind == Kind::And) {
             stack.push_back(e->body.get());
         } else {

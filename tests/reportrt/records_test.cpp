@@ -10,6 +10,9 @@
 
 #include <QFile>
 #include <QJsonDocument>
+#include <QSqlDatabase>
+#include <QSqlError>
+#include <QSqlQuery>
 #include <gtest/gtest.h>
 
 using namespace reportrt;
@@ -276,6 +279,58 @@ TEST_F(Records, ParametersBindIntoTheStatement)
           u"'2026-02-01')"));
     report->readRecords();
     EXPECT_EQ(selectedIds(*report), (std::vector<int> { 2, 7, 10 }));
+}
+
+// A host restricts a report to thousands of records with one Or term each.
+TEST_F(Records, TenThousandOrTermsSelectWhatTheDatabaseSelects)
+{
+    execute(m_database,
+        { u"INSERT INTO Orders (ID, Region, Amount) WITH RECURSIVE n(i) AS (SELECT 11 UNION ALL "
+          u"SELECT i + 1 FROM n WHERE i < 2000) SELECT i, CASE i % 7 WHEN 0 THEN 'West' ELSE "
+          u"'North' END, i % 1000 FROM n"_s });
+    QStringList terms;
+    QStringList ids; // the same terms for SQLite, written by hand
+    QStringList westAmounts;
+    for (int i = 0; i < 10000; ++i) {
+        if (i % 100 == 99) {
+            terms << u"{Orders.Region} = 'West' And {Orders.Amount} = %1"_s.arg(i);
+            westAmounts << QString::number(i);
+        } else {
+            terms << u"{Orders.ID} = %1"_s.arg(i * 3 + 1);
+            ids << QString::number(i * 3 + 1);
+        }
+    }
+    const QString formula = terms.join(u" Or "_s);
+    const auto pushed = withFormula(formula);
+    const QString sql = pushed->sqlQueryString();
+    EXPECT_TRUE(sql.contains(u"\r\nWHERE\r\n"_s)) << "the selection goes to the database";
+    pushed->readRecords();
+
+    std::vector<int> expected;
+    {
+        QSqlDatabase db = QSqlDatabase::addDatabase(u"QSQLITE"_s, u"or-terms"_s);
+        db.setDatabaseName(m_database);
+        ASSERT_TRUE(db.open());
+        QSqlQuery query(db);
+        ASSERT_TRUE(query.exec(
+            u"SELECT ID FROM Orders WHERE ID IN (%1) OR (Region = 'West' AND "
+            u"Amount IN (%2)) ORDER BY ID"_s.arg(ids.join(u", "_s), westAmounts.join(u", "_s))))
+            << query.lastError().text().toStdString();
+        while (query.next())
+            expected.push_back(query.value(0).toInt());
+    }
+    QSqlDatabase::removeDatabase(u"or-terms"_s);
+    // About a third of the 2,000 orders by ID, and a few West ones by amount.
+    ASSERT_GT(expected.size(), 600u);
+    EXPECT_EQ(selectedIds(*pushed), expected);
+    EXPECT_EQ(pushed->printingStatus().recordsRead, static_cast<int>(expected.size()))
+        << "the database did the selecting";
+
+    // Without the database's help the runtime evaluates the 10,000 terms itself.
+    const auto local = withFormula(formula);
+    local->setSqlQueryString(sql.left(sql.indexOf(u"\r\nWHERE\r\n"_s)));
+    local->readRecords();
+    EXPECT_EQ(selectedIds(*local), expected);
 }
 
 TEST_F(Records, CommandTablesRunTheAuthorsStatement)
