@@ -258,7 +258,7 @@ TEST_F(Records, NoDataEventCanCancel)
     EXPECT_EQ(raised, 1);
 }
 
-TEST_F(Records, ParametersBindIntoTheStatement)
+TEST_F(Records, ParameterValuesSelectButNeverEnterTheStatement)
 {
     QJsonObject d = shopReport();
     d[u"parameters"] = QJsonArray {
@@ -266,19 +266,62 @@ TEST_F(Records, ParametersBindIntoTheStatement)
             { u"allowsMultipleValues"_s, true } },
         QJsonObject { { u"name"_s, u"From"_s }, { u"valueType"_s, 10 } },
     };
-    d[u"selectionFormula"] = u"{Orders.Region} = {?Regions} And {Orders.OrderDate} >= {?From}"_s;
+    d[u"selectionFormula"] = u"{Orders.Region} = {?Regions} And {Orders.OrderDate} >= {?From} "
+                             u"And {Orders.ID} < 10"_s;
     const auto report = open(d);
     EXPECT_THROW(report->readRecords(), core::ComError); // no values yet
     EXPECT_EQ(report->printingStatus().progress, 4);
-    EXPECT_FALSE(report->sqlQueryString().contains(u"WHERE")); // the conditions wait for values
+    const QString withoutValues = report->sqlQueryString();
     report->parameterFields()[0]->addCurrentValue(core::Variant(QStringLiteral("North")));
     report->parameterFields()[0]->addCurrentValue(core::Variant(QStringLiteral("East")));
     report->parameterFields()[1]->addCurrentValue(core::Variant::fromDate(QDate(2026, 2, 1)));
-    EXPECT_TRUE(report->sqlQueryString().endsWith(u"WHERE" + crlf
-        + u"    (Orders.Region COLLATE BINARY IN ('North', 'East')) AND (date(Orders.OrderDate) >= "
-          u"'2026-02-01')"));
+    // Only the condition without a parameter goes to the database; the statement is the
+    // same with values as without.
+    EXPECT_EQ(report->sqlQueryString(), withoutValues);
+    EXPECT_TRUE(withoutValues.endsWith(u"WHERE" + crlf + u"    Orders.ID < 10"))
+        << withoutValues.toStdString();
     report->readRecords();
-    EXPECT_EQ(selectedIds(*report), (std::vector<int> { 2, 7, 10 }));
+    EXPECT_EQ(selectedIds(*report), (std::vector<int> { 2, 7 }));
+}
+
+// What the component does to a report: it reads the statement once, splices its selection
+// in and sets it back, and the report is saved and opened again; the parameter's value
+// changes in between. Every read must follow the value of its time.
+TEST_F(Records, ChangedParameterValuesReachEveryReadAfterTheStatementWasSetAndSaved)
+{
+    QJsonObject d = shopReport();
+    d[u"parameters"] = QJsonArray { QJsonObject {
+        { u"name"_s, u"Region"_s }, { u"valueType"_s, 12 }, { u"kind"_s, 1 } } };
+    d[u"selectionFormula"] = u"{Orders.Region} = {?Region}"_s;
+    const auto setRegion = [](runtime::Report& report, const QString& region) {
+        const auto parameter = report.parameterFields()[0];
+        parameter->clearCurrentValues();
+        parameter->addCurrentValue(core::Variant(region));
+    };
+    const auto report = open(d);
+    setRegion(*report, u"North"_s);
+    report->readRecords();
+    EXPECT_EQ(selectedIds(*report), (std::vector<int> { 1, 2, 10 }));
+    EXPECT_EQ(report->printingStatus().recordsRead, 3) << "the database selected by the value";
+
+    const QString captured = report->sqlQueryString();
+    EXPECT_FALSE(captured.contains(u"North")) << captured.toStdString();
+    report->setSqlQueryString(captured + u"\r\nWHERE\r\n    (Orders.ID <> 2)"_s);
+    setRegion(*report, u"West"_s);
+    report->readRecords();
+    EXPECT_EQ(selectedIds(*report), (std::vector<int> { 8, 9 }));
+    setRegion(*report, u"North"_s);
+    report->readRecords();
+    EXPECT_EQ(selectedIds(*report), (std::vector<int> { 1, 10 }));
+
+    const QString saved = m_dir.filePath(u"saved.rpt"_s);
+    report->saveAs(saved, 0);
+    const auto reopened = Report::open(saved);
+    relocate(*reopened, m_database);
+    EXPECT_FALSE(reopened->sqlQueryString().contains(u"North")) << "saved with the statement";
+    setRegion(*reopened, u"West"_s);
+    reopened->readRecords();
+    EXPECT_EQ(selectedIds(*reopened), (std::vector<int> { 8, 9 }));
 }
 
 // A host restricts a report to thousands of records with one Or term each.
