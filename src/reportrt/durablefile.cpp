@@ -69,7 +69,9 @@ bool DurableFile::finish()
 {
     if (!m_failed && !isOpen())
         fail(QStringLiteral("the file is not open"));
-    if (!m_failed && !flush())
+    // A short write leaves the rest of the buffer behind; writing it again completes or
+    // gives the reason the first attempt stopped, which a short write does not tell.
+    if (!m_failed && !flush() && !flush())
         fail(errorString());
     if (!m_failed && ::fsync(handle()) != 0)
         fail(systemError(errno));

@@ -333,6 +333,7 @@ struct FullDiskCase {
     const char* name;
     testsupport::FullDisk::Kind kind;
     qsizetype commentLength; // makes the document larger than the writer's buffer or not
+    const char16_t* cause; // what the error names, in the C library's words
 };
 
 class SavingToAFullDisk : public testing::TestWithParam<FullDiskCase> { };
@@ -366,6 +367,8 @@ TEST_P(SavingToAFullDisk, FailsAndLeavesTheOldFileAndNoTemporaryFile)
     } catch (const core::ComError& error) {
         EXPECT_EQ(error.number(), Error::SaveFailed);
         EXPECT_TRUE(error.description().contains(path)) << error.description().toStdString();
+        EXPECT_TRUE(error.description().contains(QStringView(GetParam().cause)))
+            << error.description().toStdString();
     }
 
     QFile file(path);
@@ -378,10 +381,14 @@ TEST_P(SavingToAFullDisk, FailsAndLeavesTheOldFileAndNoTemporaryFile)
 }
 
 INSTANTIATE_TEST_SUITE_P(SavingFiles, SavingToAFullDisk,
-    testing::Values(FullDiskCase { "TmpfsSmallDocument", testsupport::FullDisk::Kind::Tmpfs, 10 },
-        FullDiskCase { "TmpfsLargeDocument", testsupport::FullDisk::Kind::Tmpfs, 200000 },
-        FullDiskCase { "SizeLimitSmallDocument", testsupport::FullDisk::Kind::SizeLimit, 10 },
-        FullDiskCase { "SizeLimitLargeDocument", testsupport::FullDisk::Kind::SizeLimit, 200000 }),
+    testing::Values(
+        FullDiskCase { "TmpfsSmallDocument", testsupport::FullDisk::Kind::Tmpfs, 10, u"No space" },
+        FullDiskCase {
+            "TmpfsLargeDocument", testsupport::FullDisk::Kind::Tmpfs, 200000, u"No space" },
+        FullDiskCase {
+            "SizeLimitSmallDocument", testsupport::FullDisk::Kind::SizeLimit, 10, u"too large" },
+        FullDiskCase { "SizeLimitLargeDocument", testsupport::FullDisk::Kind::SizeLimit, 200000,
+            u"too large" }),
     [](const testing::TestParamInfo<FullDiskCase>& param) {
         return std::string(param.param.name);
     });
