@@ -80,7 +80,8 @@ struct Report::Plan {
     std::map<const ReportObject*, int> summaryOfObject;
     std::vector<RecordReader::Column> columns;
     std::vector<QString> columnReferences;
-    QString sql;
+    QString sql; // the statement as the report shows and saves it
+    QString runSql; // what runs: sql, or with this run's parameter conditions added
     bool matchByName = false;
     bool isProcedure = false;
     SqlDialect dialect = SqlDialect::SQLite;
@@ -337,13 +338,19 @@ std::shared_ptr<Report::Plan> Report::plan(bool bindParameters) const
         return SqlStatement::columnName(p->tables[static_cast<size_t>(t)],
             p->tables[static_cast<size_t>(t)].fields[static_cast<size_t>(f)]);
     });
+    // The statement text is read back, set again and saved with the report, so a
+    // parameter's value in it would outlive the value's change: conditions with one are
+    // left out of the text. This run's values still narrow the generated statement that
+    // runs; a set statement leaves them to the records, still ahead of the others.
     std::vector<const FormulaExpr*> translated;
     std::vector<QString> where;
+    std::vector<const FormulaExpr*> bound;
+    std::vector<QString> boundWhere;
     std::vector<const FormulaExpr*> rest;
     for (const FormulaExpr* conjunct : FormulaCompiler::conjuncts(p->selection.get())) {
         if (auto sql = translator.translate(*conjunct)) {
-            translated.push_back(conjunct);
-            where.push_back(*sql);
+            (conjunct->usesParameter ? bound : translated).push_back(conjunct);
+            (conjunct->usesParameter ? boundWhere : where).push_back(*sql);
         } else {
             rest.push_back(conjunct);
         }
@@ -375,6 +382,7 @@ std::shared_ptr<Report::Plan> Report::plan(bool bindParameters) const
                                                         : QString(u"{CALL " + call + u'}'));
         }
         p->conditions = translated;
+        p->conditions.insert(p->conditions.end(), bound.begin(), bound.end());
         p->conditions.insert(p->conditions.end(), rest.begin(), rest.end());
     } else {
         std::vector<SqlStatement::OrderKey> order;
@@ -399,13 +407,21 @@ std::shared_ptr<Report::Plan> Report::plan(bool bindParameters) const
         if (statementSet) {
             p->sql = m_document.sqlQuery;
             p->conditions = translated;
+            p->conditions.insert(p->conditions.end(), bound.begin(), bound.end());
             p->conditions.insert(p->conditions.end(), rest.begin(), rest.end());
         } else {
             p->sql = SqlStatement::select(
                 p->tables, m_document.links, p->environment->columns(), where, order);
+            if (!boundWhere.empty()) {
+                where.insert(where.end(), boundWhere.begin(), boundWhere.end());
+                p->runSql = SqlStatement::select(
+                    p->tables, m_document.links, p->environment->columns(), where, order);
+            }
             p->conditions = rest;
         }
     }
+    if (p->runSql.isEmpty())
+        p->runSql = p->sql;
 
     // What the records depend on. The password takes no part: the signature is saved.
     QStringList inputs { p->sql, m_document.selectionFormula };
@@ -473,7 +489,7 @@ void Report::readInto(Plan& p)
     SqlConnection& c = connection(p.tables.front().connection);
     RecordReader::Request request;
     request.database = c.database();
-    request.sql = p.sql;
+    request.sql = p.runSql;
     request.columns = p.columns;
     request.matchByName = p.matchByName;
     request.conditions = p.conditions;

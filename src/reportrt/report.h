@@ -25,9 +25,11 @@ class SqlConnection;
 /// generated from the tables, links, used fields, groups and sorts, with every condition
 /// of the selection formula that translates to SQL in its WHERE clause, until a statement
 /// is set; a set statement is run as it is and the whole formula is then evaluated on
-/// each record. The records read stay as saved data: reading again reuses them while the
-/// statement, the formula, the parameter values and the connection are the same, and
-/// reads anew when any of them changed.
+/// each record. Conditions on parameter values narrow the generated statement that runs
+/// but never enter its text (sqlQueryString), which hosts read back, set and save. The
+/// records read stay as saved data: reading again reuses them while the statement, the
+/// formula, the parameter values and the connection are the same, and reads anew when
+/// any of them changed.
 class Report : public runtime::Report {
 public:
     /// Reads a report file; raises Error::OpenReportFailed or Error::InvalidDocument.

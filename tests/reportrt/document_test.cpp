@@ -6,7 +6,9 @@
 #include "runtime/parameterfield.h"
 #include "runtime/reportobject.h"
 #include "runtime/section.h"
+#include "support/fulldisk.h"
 
+#include <QDir>
 #include <QFile>
 #include <QJsonDocument>
 #include <gtest/gtest.h>
@@ -326,6 +328,70 @@ TEST(SavingFiles, UnknownFormatAndUnwritablePathLeaveNothingBehind)
         EXPECT_EQ(error.number(), Error::SaveFailed);
     }
 }
+
+struct FullDiskCase {
+    const char* name;
+    testsupport::FullDisk::Kind kind;
+    qsizetype commentLength; // makes the document larger than the writer's buffer or not
+    const char16_t* cause; // what the error names, in the C library's words
+};
+
+class SavingToAFullDisk : public testing::TestWithParam<FullDiskCase> { };
+
+TEST_P(SavingToAFullDisk, FailsAndLeavesTheOldFileAndNoTemporaryFile)
+{
+    QTemporaryDir source;
+    QTemporaryDir target;
+    testsupport::FullDisk disk(GetParam().kind, target.path());
+    if (!disk.isReady())
+        GTEST_SKIP() << "this process may not mount a file system";
+    const QString path = target.filePath(QStringLiteral("orders.rpt"));
+    QJsonObject old = shopReport();
+    old[u"selectionFormula"] = u"{Orders.ID} = 1"_s;
+    const QByteArray oldBytes = QJsonDocument(old).toJson();
+    {
+        QFile file(path);
+        ASSERT_TRUE(file.open(QIODevice::WriteOnly));
+        ASSERT_EQ(file.write(oldBytes), oldBytes.size());
+    }
+    QJsonObject changed = shopReport();
+    changed[u"summary"]
+        = QJsonObject { { u"comments"_s, QString(GetParam().commentLength, u'c') } };
+    const auto report = Report::open(writeReport(source, changed));
+    const QStringList before = QDir(target.path()).entryList(QDir::Files | QDir::Hidden);
+
+    disk.fill();
+    try {
+        report->saveAs(path, 2048);
+        ADD_FAILURE() << "the save reported success";
+    } catch (const core::ComError& error) {
+        EXPECT_EQ(error.number(), Error::SaveFailed);
+        EXPECT_TRUE(error.description().contains(path)) << error.description().toStdString();
+        EXPECT_TRUE(error.description().contains(QStringView(GetParam().cause)))
+            << error.description().toStdString();
+    }
+
+    QFile file(path);
+    ASSERT_TRUE(file.open(QIODevice::ReadOnly));
+    EXPECT_EQ(file.readAll(), oldBytes);
+    QStringList after = QDir(target.path()).entryList(QDir::Files | QDir::Hidden);
+    after.removeAll(QStringLiteral("filler"));
+    EXPECT_EQ(after, QStringList { QStringLiteral("orders.rpt") }) << "a temporary file is left";
+    EXPECT_EQ(before, QStringList { QStringLiteral("orders.rpt") });
+}
+
+INSTANTIATE_TEST_SUITE_P(SavingFiles, SavingToAFullDisk,
+    testing::Values(
+        FullDiskCase { "TmpfsSmallDocument", testsupport::FullDisk::Kind::Tmpfs, 10, u"No space" },
+        FullDiskCase {
+            "TmpfsLargeDocument", testsupport::FullDisk::Kind::Tmpfs, 200000, u"No space" },
+        FullDiskCase {
+            "SizeLimitSmallDocument", testsupport::FullDisk::Kind::SizeLimit, 10, u"too large" },
+        FullDiskCase { "SizeLimitLargeDocument", testsupport::FullDisk::Kind::SizeLimit, 200000,
+            u"too large" }),
+    [](const testing::TestParamInfo<FullDiskCase>& param) {
+        return std::string(param.param.name);
+    });
 
 TEST(Parameters, CurrentValuesConvertReplaceOrJoinAndRespectTheList)
 {

@@ -1,5 +1,6 @@
 #include "reportrt/formula/formulacompiler.h"
 #include "reportrt/formula/formulaevaluator.h"
+#include "reportrt/formula/formulaparser.h"
 #include "reportrttest.h"
 
 #include <gtest/gtest.h>
@@ -151,6 +152,18 @@ INSTANTIATE_TEST_SUITE_P(Formulas, FormulaEvaluation,
         EvaluationCase { "TrueAndNull", u"True And {T.N} = 1", record(null, text), u"<null>" },
         EvaluationCase { "TrueOrNull", u"{T.N} = 1 Or True", record(null, text), u"True" },
         EvaluationCase { "FalseOrNull", u"False Or {T.N} = 1", record(null, text), u"<null>" },
+        // Chains of three or more operands decide at the first deciding operand wherever it
+        // stands; a Null that decides nothing makes the chain Null.
+        EvaluationCase {
+            "NullChainOrDecidedLast", u"False Or {T.N} = 1 Or True", record(null, text), u"True" },
+        EvaluationCase {
+            "NullChainOrUndecided", u"False Or {T.N} = 1 Or False", record(null, text), u"<null>" },
+        EvaluationCase { "NullChainAndDecidedLast", u"True And {T.N} = 1 And False",
+            record(null, text), u"False" },
+        EvaluationCase { "NullChainAndUndecided", u"{T.N} = 1 And True And True",
+            record(null, text), u"<null>" },
+        EvaluationCase { "MixedChainPrecedence", u"False Or True And False Or {T.N} = 10 And True",
+            record(ten, text), u"True" },
         EvaluationCase { "NotNull", u"Not ({T.N} = 1)", record(null, text), u"<null>" },
         EvaluationCase { "NullInList", u"{T.N} In [1, 2]", record(null, text), u"<null>" },
         EvaluationCase { "NullBoolean", u"Not {T.B}", record(ten, text, null), u"<null>" },
@@ -258,14 +271,47 @@ TEST(FormulaParsing, HostileNestingIsRefusedNotCrashed)
     FormulaCompiler compiler(environment, FormulaCompiler::Mode::Check);
     const QString parentheses = QString(100000, u'(') + u'1' + QString(100000, u')');
     EXPECT_THROW(compiler.compile(parentheses, QStringLiteral("Test")), FormulaException);
-    QString chain = QStringLiteral("True");
+    // Nesting by parentheses counts however the operators inside are chained.
+    QString nestedOr = QStringLiteral("True");
+    for (int i = 0; i < FormulaParser::maxDepth; ++i)
+        nestedOr = u'(' + nestedOr + u" Or False)";
+    EXPECT_THROW(compiler.compile(nestedOr, QStringLiteral("Test")), FormulaException);
+    // Arithmetic chains are trees one level deeper per operator.
+    QString sum = QStringLiteral("1");
     for (int i = 0; i < 50000; ++i)
-        chain += QStringLiteral(" And True");
-    EXPECT_THROW(compiler.compile(chain, QStringLiteral("Test")), FormulaException);
+        sum += QStringLiteral(" + 1");
+    EXPECT_THROW(compiler.compile(sum, QStringLiteral("Test")), FormulaException);
     QString nots;
     for (int i = 0; i < 50000; ++i)
         nots += QStringLiteral("Not ");
     EXPECT_THROW(compiler.compile(nots + u"True", QStringLiteral("Test")), FormulaException);
+}
+
+TEST(FormulaParsing, LongFlatAndOrChainsAreNoNesting)
+{
+    TestEnvironment environment;
+    FormulaCompiler binder(environment, FormulaCompiler::Mode::Bind);
+    FormulaCompiler checker(environment, FormulaCompiler::Mode::Check);
+    const std::vector<Value> values
+        = record(Value::number(10), Value::string(QStringLiteral("Alpha")));
+    // 50,000 operands: deep enough to overflow the stack of any recursive walk, also
+    // under ASan, if a chain were a tree of two-operand nodes.
+    QString orChain = QStringLiteral("{T.N} = 0");
+    QString andChain = QStringLiteral("{T.N} > 0");
+    for (int i = 1; i < 50000; ++i) {
+        orChain += QStringLiteral(" Or {T.N} = %1").arg(i * 20);
+        andChain += QStringLiteral(" And {T.N} <> %1").arg(i * 20 + 1);
+    }
+    for (FormulaCompiler* compiler : { &binder, &checker }) {
+        const auto ored = compiler->compile(orChain, QStringLiteral("Test"));
+        ASSERT_NE(ored, nullptr);
+        EXPECT_FALSE(FormulaEvaluator::isTrue(ored.get(), values.data()))
+            << "10 is no multiple of 20";
+        const auto anded = compiler->compile(andChain, QStringLiteral("Test"));
+        ASSERT_NE(anded, nullptr);
+        EXPECT_TRUE(FormulaEvaluator::isTrue(anded.get(), values.data()));
+        EXPECT_EQ(FormulaCompiler::conjuncts(anded.get()).size(), 50000u);
+    }
 }
 
 TEST(FormulaParsing, ConjunctsSplitTopLevelAndOnly)

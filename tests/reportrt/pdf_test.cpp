@@ -5,6 +5,7 @@
 #include "reportrt/reportobject.h"
 #include "reportrt/section.h"
 #include "runtime/parameterfield.h"
+#include "support/fulldisk.h"
 
 #include <QBuffer>
 #include <QDir>
@@ -230,6 +231,48 @@ TEST(PdfExport, AFailureHalfwayKeepsTheOldFile)
     EXPECT_EQ(QDir(dir.filePath(u"out"_s)).entryList(QDir::Files | QDir::Hidden),
         QStringList { u"report.pdf"_s });
 }
+
+class PdfExportOnAFullDisk : public testing::TestWithParam<testsupport::FullDisk::Kind> { };
+
+TEST_P(PdfExportOnAFullDisk, FailsAndKeepsTheOldFile)
+{
+    QTemporaryDir dir;
+    QTemporaryDir full;
+    testsupport::FullDisk disk(GetParam(), full.path());
+    if (!disk.isReady())
+        GTEST_SKIP() << "this process may not mount a file system";
+    auto report = openReport(
+        writeReport(
+            dir, itemsReport({ section(u"D"_s, 300, { fieldObject(u"{Items.Name}"_s, 0, 0) }) })),
+        itemsDatabase(dir, 3));
+    report->readRecords();
+    const QString target = full.filePath(u"report.pdf"_s);
+    QFile old(target);
+    ASSERT_TRUE(old.open(QIODevice::WriteOnly));
+    old.write("the previous export");
+    old.close();
+
+    disk.fill();
+    try {
+        exportPdf(*report, target);
+        ADD_FAILURE() << "the export reported success";
+    } catch (const core::ComError& error) {
+        EXPECT_EQ(error.number(), Error::ExportFailed);
+    }
+    QFile kept(target);
+    ASSERT_TRUE(kept.open(QIODevice::ReadOnly));
+    EXPECT_EQ(kept.readAll(), QByteArray("the previous export"));
+    QStringList left = QDir(full.path()).entryList(QDir::Files | QDir::Hidden);
+    left.removeAll(u"filler"_s);
+    EXPECT_EQ(left, QStringList { u"report.pdf"_s });
+}
+
+INSTANTIATE_TEST_SUITE_P(Pdf, PdfExportOnAFullDisk,
+    testing::Values(testsupport::FullDisk::Kind::Tmpfs, testsupport::FullDisk::Kind::SizeLimit),
+    [](const testing::TestParamInfo<testsupport::FullDisk::Kind>& param) {
+        return std::string(
+            param.param == testsupport::FullDisk::Kind::Tmpfs ? "Tmpfs" : "SizeLimit");
+    });
 
 TEST(PdfExport, AReadOnlyTargetIsReplacedWhenTheFolderIsWritable)
 {

@@ -12,6 +12,9 @@
 #include <QDir>
 #include <QFile>
 #include <QJsonDocument>
+#include <QSqlDatabase>
+#include <QSqlError>
+#include <QSqlQuery>
 #include <gtest/gtest.h>
 
 using namespace reportrt;
@@ -257,7 +260,7 @@ TEST_F(Records, NoDataEventCanCancel)
     EXPECT_EQ(raised, 1);
 }
 
-TEST_F(Records, ParametersBindIntoTheStatement)
+TEST_F(Records, ParameterValuesSelectButNeverEnterTheStatement)
 {
     QJsonObject d = shopReport();
     d[u"parameters"] = QJsonArray {
@@ -265,19 +268,114 @@ TEST_F(Records, ParametersBindIntoTheStatement)
             { u"allowsMultipleValues"_s, true } },
         QJsonObject { { u"name"_s, u"From"_s }, { u"valueType"_s, 10 } },
     };
-    d[u"selectionFormula"] = u"{Orders.Region} = {?Regions} And {Orders.OrderDate} >= {?From}"_s;
+    d[u"selectionFormula"] = u"{Orders.Region} = {?Regions} And {Orders.OrderDate} >= {?From} "
+                             u"And {Orders.ID} < 10"_s;
     const auto report = open(d);
     EXPECT_THROW(report->readRecords(), core::ComError); // no values yet
     EXPECT_EQ(report->printingStatus().progress, 4);
-    EXPECT_FALSE(report->sqlQueryString().contains(u"WHERE")); // the conditions wait for values
+    const QString withoutValues = report->sqlQueryString();
     report->parameterFields()[0]->addCurrentValue(core::Variant(QStringLiteral("North")));
     report->parameterFields()[0]->addCurrentValue(core::Variant(QStringLiteral("East")));
     report->parameterFields()[1]->addCurrentValue(core::Variant::fromDate(QDate(2026, 2, 1)));
-    EXPECT_TRUE(report->sqlQueryString().endsWith(u"WHERE" + crlf
-        + u"    (Orders.Region COLLATE BINARY IN ('North', 'East')) AND (date(Orders.OrderDate) >= "
-          u"'2026-02-01')"));
+    // Only the condition without a parameter goes to the database; the statement is the
+    // same with values as without.
+    EXPECT_EQ(report->sqlQueryString(), withoutValues);
+    EXPECT_TRUE(withoutValues.endsWith(u"WHERE" + crlf + u"    Orders.ID < 10"))
+        << withoutValues.toStdString();
     report->readRecords();
-    EXPECT_EQ(selectedIds(*report), (std::vector<int> { 2, 7, 10 }));
+    EXPECT_EQ(selectedIds(*report), (std::vector<int> { 2, 7 }));
+}
+
+// What the component does to a report: it reads the statement once, splices its selection
+// in and sets it back, and the report is saved and opened again; the parameter's value
+// changes in between. Every read must follow the value of its time.
+TEST_F(Records, ChangedParameterValuesReachEveryReadAfterTheStatementWasSetAndSaved)
+{
+    QJsonObject d = shopReport();
+    d[u"parameters"] = QJsonArray { QJsonObject {
+        { u"name"_s, u"Region"_s }, { u"valueType"_s, 12 }, { u"kind"_s, 1 } } };
+    d[u"selectionFormula"] = u"{Orders.Region} = {?Region}"_s;
+    const auto setRegion = [](runtime::Report& report, const QString& region) {
+        const auto parameter = report.parameterFields()[0];
+        parameter->clearCurrentValues();
+        parameter->addCurrentValue(core::Variant(region));
+    };
+    const auto report = open(d);
+    setRegion(*report, u"North"_s);
+    report->readRecords();
+    EXPECT_EQ(selectedIds(*report), (std::vector<int> { 1, 2, 10 }));
+    EXPECT_EQ(report->printingStatus().recordsRead, 3) << "the database selected by the value";
+
+    const QString captured = report->sqlQueryString();
+    EXPECT_FALSE(captured.contains(u"North")) << captured.toStdString();
+    report->setSqlQueryString(captured + u"\r\nWHERE\r\n    (Orders.ID <> 2)"_s);
+    setRegion(*report, u"West"_s);
+    report->readRecords();
+    EXPECT_EQ(selectedIds(*report), (std::vector<int> { 8, 9 }));
+    setRegion(*report, u"North"_s);
+    report->readRecords();
+    EXPECT_EQ(selectedIds(*report), (std::vector<int> { 1, 10 }));
+
+    const QString saved = m_dir.filePath(u"saved.rpt"_s);
+    report->saveAs(saved, 0);
+    const auto reopened = Report::open(saved);
+    relocate(*reopened, m_database);
+    EXPECT_FALSE(reopened->sqlQueryString().contains(u"North")) << "saved with the statement";
+    setRegion(*reopened, u"West"_s);
+    reopened->readRecords();
+    EXPECT_EQ(selectedIds(*reopened), (std::vector<int> { 8, 9 }));
+}
+
+// A host restricts a report to thousands of records with one Or term each.
+TEST_F(Records, TenThousandOrTermsSelectWhatTheDatabaseSelects)
+{
+    execute(m_database,
+        { u"INSERT INTO Orders (ID, Region, Amount) WITH RECURSIVE n(i) AS (SELECT 11 UNION ALL "
+          u"SELECT i + 1 FROM n WHERE i < 2000) SELECT i, CASE i % 7 WHEN 0 THEN 'West' ELSE "
+          u"'North' END, i % 1000 FROM n"_s });
+    QStringList terms;
+    QStringList ids; // the same terms for SQLite, written by hand
+    QStringList westAmounts;
+    for (int i = 0; i < 10000; ++i) {
+        if (i % 100 == 99) {
+            terms << u"{Orders.Region} = 'West' And {Orders.Amount} = %1"_s.arg(i);
+            westAmounts << QString::number(i);
+        } else {
+            terms << u"{Orders.ID} = %1"_s.arg(i * 3 + 1);
+            ids << QString::number(i * 3 + 1);
+        }
+    }
+    const QString formula = terms.join(u" Or "_s);
+    const auto pushed = withFormula(formula);
+    const QString sql = pushed->sqlQueryString();
+    EXPECT_TRUE(sql.contains(u"\r\nWHERE\r\n"_s)) << "the selection goes to the database";
+    pushed->readRecords();
+
+    std::vector<int> expected;
+    {
+        QSqlDatabase db = QSqlDatabase::addDatabase(u"QSQLITE"_s, u"or-terms"_s);
+        db.setDatabaseName(m_database);
+        ASSERT_TRUE(db.open());
+        QSqlQuery query(db);
+        ASSERT_TRUE(query.exec(
+            u"SELECT ID FROM Orders WHERE ID IN (%1) OR (Region = 'West' AND "
+            u"Amount IN (%2)) ORDER BY ID"_s.arg(ids.join(u", "_s), westAmounts.join(u", "_s))))
+            << query.lastError().text().toStdString();
+        while (query.next())
+            expected.push_back(query.value(0).toInt());
+    }
+    QSqlDatabase::removeDatabase(u"or-terms"_s);
+    // About a third of the 2,000 orders by ID, and a few West ones by amount.
+    ASSERT_GT(expected.size(), 600u);
+    EXPECT_EQ(selectedIds(*pushed), expected);
+    EXPECT_EQ(pushed->printingStatus().recordsRead, static_cast<int>(expected.size()))
+        << "the database did the selecting";
+
+    // Without the database's help the runtime evaluates the 10,000 terms itself.
+    const auto local = withFormula(formula);
+    local->setSqlQueryString(sql.left(sql.indexOf(u"\r\nWHERE\r\n"_s)));
+    local->readRecords();
+    EXPECT_EQ(selectedIds(*local), expected);
 }
 
 TEST_F(Records, CommandTablesRunTheAuthorsStatement)

@@ -1,11 +1,14 @@
 // The report object over the real report runtime, on a SQLite database made by the test:
 // the selection reaches the runtime's formula and statement, and the records read follow.
 
+#include "core/dictionary.h"
 #include "reportrt/output/registerruntime.h"
 #include "reporttest.h"
 #include "runtime/applicationfactory.h"
 #include "runtime/report.h"
+#include "support/fulldisk.h"
 
+#include <QDir>
 #include <QFile>
 #include <QJsonArray>
 #include <QJsonDocument>
@@ -39,7 +42,7 @@ void createShop(const QString& path)
     QSqlDatabase::removeDatabase(connection);
 }
 
-QJsonObject ordersReport(const QString& selectionFormula)
+QJsonObject ordersReport(const QString& selectionFormula, const QJsonArray& parameters = {})
 {
     const QJsonArray designerConnection {
         QJsonObject { { u"name"_s, u"Provider"_s }, { u"value"_s, u"SQLOLEDB"_s } },
@@ -59,6 +62,7 @@ QJsonObject ordersReport(const QString& selectionFormula)
                 { u"location"_s, u"shop.dbo.Orders"_s }, { u"driver"_s, u"crdb_ado.dll"_s },
                 { u"connection"_s, designerConnection }, { u"fields"_s, fields } } } },
         { u"selectionFormula"_s, selectionFormula },
+        { u"parameters"_s, parameters },
         { u"sections"_s,
             QJsonArray { QJsonObject { { u"name"_s, u"D"_s }, { u"height"_s, 300 },
                 { u"objects"_s,
@@ -66,6 +70,14 @@ QJsonObject ordersReport(const QString& selectionFormula)
                         { u"name"_s, u"IDField"_s }, { u"field"_s, u"{Orders.ID}"_s },
                         { u"width"_s, 1000 }, { u"height"_s, 240 } } } } } } },
     };
+}
+
+/// The host's value for the parameter S.
+std::shared_ptr<core::Dictionary> statusValue(const QString& value)
+{
+    auto values = std::make_shared<core::Dictionary>();
+    values->add(u"S"_s, core::Variant(value));
+    return values;
 }
 
 class RealRuntime : public ::testing::Test {
@@ -90,14 +102,22 @@ protected:
         engine::gServerType = engine::ecstMSSQL;
     }
 
-    std::shared_ptr<reports::MoxReport115> report(const QString& selectionFormula)
+    std::shared_ptr<reports::MoxReport115> report(const QString& selectionFormula,
+        const QJsonArray& parameters = {}, const QString& folder = QString())
     {
-        const QString path = m_folder.filePath(u"orders.rpt"_s);
+        const QString path
+            = QDir(folder.isEmpty() ? m_folder.path() : folder).filePath(u"orders.rpt"_s);
         QFile file(path);
         EXPECT_TRUE(file.open(QIODevice::WriteOnly | QIODevice::Truncate));
-        file.write(QJsonDocument(ordersReport(selectionFormula)).toJson());
+        file.write(QJsonDocument(ordersReport(selectionFormula, parameters)).toJson());
         file.close();
         return m_reports->Item(path);
+    }
+
+    static QByteArray contents(const QString& path)
+    {
+        QFile file(path);
+        return file.open(QIODevice::ReadOnly) ? file.readAll() : QByteArray("<unreadable>");
     }
 
     static int32_t recordsSelected(runtime::Report& runtimeReport)
@@ -172,5 +192,90 @@ TEST_F(RealRuntime, SavingForEditingAndReplacingKeepTheMarkersWorking)
             u"AND ({Orders.ID}=3)"_s }));
     EXPECT_EQ(recordsSelected(*reopened), 1);
 }
+
+// A report with a text parameter in its selection: the host changes the value between
+// reads, after the component captured the runtime's statement to splice a list into it, and
+// after the report went through the editing cycle. Each read selects by the value of its
+// time.
+TEST_F(RealRuntime, AChangedParameterValueSelectsAtEveryStepOfTheCycle)
+{
+    const QJsonArray status { QJsonObject { { u"name"_s, u"S"_s }, { u"valueType"_s, 12 } } };
+    const auto orders = report(u"{Orders.Status} = {?S}"_s, status);
+    ASSERT_TRUE(orders->SetParams(statusValue(u"open"_s)));
+    ASSERT_TRUE(orders->SetSelection(u"Orders"_s,
+        core::VariantArray::fromList({ int32_t(1), int32_t(3), int32_t(5), int32_t(7) })));
+    auto runtimeReport = orders->C_Report();
+    ASSERT_TRUE(runtimeReport) << m_engine->LastError().toStdString();
+    EXPECT_EQ(recordsSelected(*runtimeReport), 3); // 1, 3 and 7 are open
+    EXPECT_FALSE(runtimeReport->sqlQueryString().contains(u"open"))
+        << runtimeReport->sqlQueryString().toStdString();
+
+    ASSERT_TRUE(orders->SetParams(statusValue(u"closed"_s)));
+    runtimeReport = orders->C_Report();
+    ASSERT_TRUE(runtimeReport);
+    EXPECT_EQ(recordsSelected(*runtimeReport), 1); // 5
+    EXPECT_TRUE(runtimeReport->sqlQueryString().endsWith(u"WHERE\r\n    Orders.ID IN (1,3,5,7)"_s))
+        << runtimeReport->sqlQueryString().toStdString();
+
+    const QString scratch = m_folder.filePath(u"scratch.rpt"_s);
+    ASSERT_TRUE(orders->SaveReport(scratch));
+    EXPECT_FALSE(contents(scratch).contains("IN (1,3,5,7)")) << "the author's statement is saved";
+    ASSERT_TRUE(orders->ReplaceEdited(scratch));
+    ASSERT_TRUE(orders->SetParams(statusValue(u"open"_s)));
+    runtimeReport = orders->C_Report();
+    ASSERT_TRUE(runtimeReport) << m_engine->LastError().toStdString();
+    EXPECT_EQ(recordsSelected(*runtimeReport), 3);
+
+    // The saved copy, opened as a report of its own, selects by whatever value it gets.
+    const auto copy = m_reports->Item(scratch);
+    ASSERT_TRUE(copy->SetParams(statusValue(u"closed"_s)));
+    const auto copyReport = copy->C_Report();
+    ASSERT_TRUE(copyReport) << m_engine->LastError().toStdString();
+    EXPECT_EQ(recordsSelected(*copyReport), 1);
+}
+
+struct FullDiskCase {
+    const char* name;
+    testsupport::FullDisk::Kind kind;
+};
+
+class RealRuntimeOnAFullDisk : public RealRuntime,
+                               public testing::WithParamInterface<FullDiskCase> { };
+
+TEST_P(RealRuntimeOnAFullDisk, SavingAndReplacingFailAndKeepTheFiles)
+{
+    QTemporaryDir full;
+    testsupport::FullDisk disk(GetParam().kind, full.path());
+    if (!disk.isReady())
+        GTEST_SKIP() << "this process may not mount a file system";
+    const auto orders = report(u"{Orders.Status} = 'open'"_s, {}, full.path());
+    const QString ownFile = full.filePath(u"orders.rpt"_s);
+    ASSERT_TRUE(orders->SetSelection(u"Orders"_s, int32_t(3)));
+    ASSERT_TRUE(orders->C_Report()) << m_engine->LastError().toStdString();
+    // An earlier copy for editing, and an edited one to put in place, outside the full disk.
+    const QString scratch = full.filePath(u"scratch.rpt"_s);
+    ASSERT_TRUE(orders->SaveReport(scratch));
+    const QString edited = m_folder.filePath(u"edited.rpt"_s);
+    ASSERT_TRUE(orders->SaveReport(edited));
+    const QByteArray scratchBytes = contents(scratch);
+    const QByteArray ownBytes = contents(ownFile);
+
+    disk.fill();
+    EXPECT_FALSE(orders->SaveReport(scratch));
+    EXPECT_FALSE(orders->ReplaceEdited(edited, u"{Orders.Total} > 100"_s));
+
+    EXPECT_EQ(contents(scratch), scratchBytes);
+    EXPECT_EQ(contents(ownFile), ownBytes);
+    QStringList left = QDir(full.path()).entryList(QDir::Files | QDir::Hidden);
+    left.removeAll(u"filler"_s);
+    EXPECT_EQ(left, (QStringList { u"orders.rpt"_s, u"scratch.rpt"_s }));
+}
+
+INSTANTIATE_TEST_SUITE_P(RealRuntime, RealRuntimeOnAFullDisk,
+    testing::Values(FullDiskCase { "Tmpfs", testsupport::FullDisk::Kind::Tmpfs },
+        FullDiskCase { "SizeLimit", testsupport::FullDisk::Kind::SizeLimit }),
+    [](const testing::TestParamInfo<FullDiskCase>& param) {
+        return std::string(param.param.name);
+    });
 
 } // namespace

@@ -7,6 +7,7 @@ Run by CTest with LUDMOX_LUDMOXD set to the server and PYTHONPATH to python/.
 
 import json
 import os
+import re
 import sqlite3
 import subprocess
 import tempfile
@@ -153,6 +154,48 @@ class ReportThroughLudmoxd(unittest.TestCase):
         self.assertTrue(report.CloseReport(True))
         self.assertIsNone(report.CloseReport8())
         self.assertEqual(report.Status.Progress, 0)
+
+    def export_records(self, path, status):
+        """Exports a saved report with the command-line host and a value for S; the number
+        of records it printed."""
+        output = os.path.join(self.folder.name, "out")
+        done = subprocess.run(
+            [os.environ["LUDMOX_CLI"], "export", "--database", self.database, "--output", output,
+             "--param", "S=" + status, path],
+            capture_output=True, text=True, timeout=120, check=False)
+        self.assertEqual(done.returncode, 0, done.stderr)
+        match = re.search(r": (\d+) records,", done.stdout)
+        self.assertTrue(match, done.stdout)
+        return int(match.group(1))
+
+    def test_a_changed_parameter_reaches_every_statement_and_the_saved_report(self):
+        document = report_document("{Orders.Status} = {?S}")
+        document["parameters"] = [{"name": "S", "valueType": 12}]
+        path = os.path.join(self.folder.name, "by_status.rpt")
+        with open(path, "w", encoding="utf-8") as file:
+            json.dump(document, file)
+        report = self.reports.Item(path)
+
+        self.assertTrue(report.SetParams(self.mox.dictionary({"S": "open"})))
+        # A list selection makes the component capture the runtime's statement.
+        self.assertTrue(report.SetSelection("Orders", [1, 3, 5]))
+        statement = report.C_Report.SQLQueryString.get()
+        self.assertTrue(statement.endswith("WHERE" + CRLF + "    Orders.ID IN (1,3,5)"), statement)
+        self.assertNotIn("'open'", statement)
+
+        self.assertTrue(report.SetParams(self.mox.dictionary({"S": "closed"})))
+        statement = report.C_Report.SQLQueryString.get()
+        self.assertNotIn("'open'", statement)
+        self.assertNotIn("'closed'", statement)
+
+        scratch = os.path.join(self.folder.name, "scratch.rpt")
+        self.assertTrue(report.SaveReport(scratch))
+        with open(scratch, encoding="utf-8") as file:
+            self.assertNotIn("'open'", file.read())
+        # Orders 1 and 3 are open, 5 is closed.
+        self.assertEqual(self.export_records(scratch, "closed"), 1)
+        self.assertEqual(self.export_records(scratch, "open"), 2)
+        self.assertEqual(self.export_records(scratch, "none"), 0)
 
     def test_a_report_without_ole_db_tables_is_refused(self):
         document = report_document("")

@@ -139,7 +139,7 @@ QString SqlStatement::select(const std::vector<TableDefinition>& tables,
         for (const QString& c : conditions)
             parts << (conditions.size() == 1 ? c : u'(' + c + u')');
         sql += QStringView(lineBreak) + u"WHERE" + QStringView(lineBreak) + u"    "
-            + parts.join(QStringLiteral(" AND "));
+            + SqlTranslator::join(std::move(parts), u" AND ");
     }
     if (!order.empty()) {
         QStringList keys;

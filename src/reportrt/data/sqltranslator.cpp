@@ -54,6 +54,21 @@ QString sqliteTime(int32_t msecs)
 }
 } // namespace
 
+QString SqlTranslator::join(QStringList terms, QStringView op)
+{
+    // Databases parse "a OR b OR c..." into a tree as deep as the chain is long and refuse
+    // deep ones (SQLite at 1000 levels); groups in parentheses keep the depth logarithmic.
+    constexpr qsizetype groupSize = 32;
+    while (terms.size() > groupSize) {
+        QStringList groups;
+        groups.reserve(terms.size() / groupSize + 1);
+        for (qsizetype i = 0; i < terms.size(); i += groupSize)
+            groups << u'(' + terms.mid(i, groupSize).join(op) + u')';
+        terms = std::move(groups);
+    }
+    return terms.join(op);
+}
+
 SqlTranslator::SqlTranslator(
     SqlDialect dialect, std::function<QString(const FormulaExpr&)> columnName)
     : m_dialect(dialect)
@@ -301,14 +316,16 @@ std::optional<SqlTranslator::Sql> SqlTranslator::condition(const FormulaExpr& no
     }
     case Kind::And:
     case Kind::Or: {
-        const auto a = condition(*e.children[0]);
-        const auto b = condition(*e.children[1]);
-        if (!a || !b)
-            return std::nullopt;
         const int level = e.kind == Kind::And ? 2 : 1;
-        return Sql { wrap(a->text, a->precedence, level)
-                + (e.kind == Kind::And ? u" AND " : u" OR ") + wrap(b->text, b->precedence, level),
-            level };
+        QStringList terms;
+        terms.reserve(static_cast<qsizetype>(e.children.size()));
+        for (const auto& child : e.children) {
+            const auto term = condition(*child);
+            if (!term)
+                return std::nullopt;
+            terms << wrap(term->text, term->precedence, level);
+        }
+        return Sql { join(terms, e.kind == Kind::And ? u" AND " : u" OR "), level };
     }
     case Kind::Compare:
         return compare(*e.children[0], opText(e.op), *e.children[1]);

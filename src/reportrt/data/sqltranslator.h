@@ -39,6 +39,10 @@ public:
     /// A constant as an SQL literal of the dialect, or nullopt.
     static std::optional<QString> literal(SqlDialect dialect, const Value& value);
     static QString textLiteral(const QString& text);
+    /// Terms joined with op (" AND ", " OR "); each term must bind at least as tightly as
+    /// op. Long lists come in nested groups of parentheses, so any number of terms stays
+    /// within the expression depth a database parses.
+    static QString join(QStringList terms, QStringView op);
 
 private:
     struct Sql {

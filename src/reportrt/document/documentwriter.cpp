@@ -1,10 +1,11 @@
 #include "reportrt/document/documentwriter.h"
 
 #include "core/jsonwriter.h"
+#include "reportrt/base/durablefile_p.h"
 #include "reportrt/base/invarianttext.h"
 #include "reportrt/base/runtimeerror.h"
 
-#include <QSaveFile>
+#include <QDir>
 #include <cmath>
 
 using namespace Qt::StringLiterals;
@@ -324,11 +325,11 @@ void DocumentWriter::writeFile(
     const ReportDocument& document, const QString& path, bool withSavedData)
 {
     const QByteArray data = serialize(document, withSavedData);
-    QSaveFile file(path);
-    if (!file.open(QIODevice::WriteOnly))
-        raiseError(Error::SaveFailed, QStringLiteral("%1: %2").arg(path, file.errorString()));
-    if (file.write(data) != data.size() || !file.commit())
-        raiseError(Error::SaveFailed, QStringLiteral("%1: %2").arg(path, file.errorString()));
+    DurableFile file(path);
+    if (!file.start() || file.write(data) != data.size() || !file.finish())
+        raiseError(Error::SaveFailed,
+            QStringLiteral("Cannot save the report to %1: %2")
+                .arg(QDir::toNativeSeparators(path), file.failure()));
 }
 
 } // namespace reportrt

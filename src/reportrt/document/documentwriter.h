@@ -11,8 +11,10 @@ namespace reportrt {
 class DocumentWriter {
 public:
     static QByteArray serialize(const ReportDocument& document, bool withSavedData);
-    /// Writes through a temporary file that replaces the target only when complete, so a
-    /// failure leaves the old file as it was. Raises Error::SaveFailed.
+    /// Writes through a temporary file that replaces the target only once it is complete
+    /// and synced to the disk, so a failure (a full disk, a file size limit) leaves the old
+    /// file byte for byte as it was and no temporary file behind. Raises Error::SaveFailed
+    /// naming the file and the cause.
     static void writeFile(const ReportDocument& document, const QString& path, bool withSavedData);
 };
 

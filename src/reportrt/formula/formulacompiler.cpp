@@ -100,8 +100,8 @@ std::vector<const FormulaExpr*> FormulaCompiler::conjuncts(const FormulaExpr* fo
         const FormulaExpr* e = stack.back();
         stack.pop_back();
         if (e->kind == Kind::And) {
-            stack.push_back(e->children[1].get());
-            stack.push_back(e->children[0].get());
+            for (auto child = e->children.rbegin(); child != e->children.rend(); ++child)
+                stack.push_back(child->get());
         } else if (e->kind == Kind::Formula && e->body && e->body->kind == Kind::And) {
             stack.push_back(e->body.get());
         } else {
@@ -117,8 +117,10 @@ void FormulaCompiler::check(FormulaExpr& e, const QString& formulaName)
         throw FormulaException({ formulaName, e.position, message });
     };
     const auto children = [&] {
-        for (auto& child : e.children)
+        for (auto& child : e.children) {
             check(*child, formulaName);
+            e.usesParameter = e.usesParameter || child->usesParameter;
+        }
     };
     const auto scalar = [&](const FormulaExpr& child) {
         if (child.isArray)
@@ -153,6 +155,7 @@ void FormulaCompiler::check(FormulaExpr& e, const QString& formulaName)
         e.type = binding->type;
         e.isArray = binding->allowsMultipleValues;
         e.isConstant = true;
+        e.usesParameter = true;
         if (m_mode == Mode::Bind) {
             if (!binding->hasValues || binding->values.empty())
                 fail(QStringLiteral("the parameter {?%1} has no value").arg(e.name));
@@ -177,6 +180,7 @@ void FormulaCompiler::check(FormulaExpr& e, const QString& formulaName)
         e.type = e.body->type;
         e.isArray = e.body->isArray;
         e.isConstant = e.body->isConstant;
+        e.usesParameter = e.body->usesParameter;
         return;
     }
     case Kind::List: {
@@ -577,6 +581,7 @@ void FormulaCompiler::fold(std::unique_ptr<FormulaExpr>& e)
         literal->literal = std::move(value);
         literal->type = e->type; // a folded Null keeps the type of what it stands for
         literal->isConstant = true;
+        literal->usesParameter = e->usesParameter;
         e = std::move(literal);
     } catch (const FormulaException&) {
         // Left as it is: the error is raised when a record reaches it, as without folding.

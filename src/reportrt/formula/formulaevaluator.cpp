@@ -504,27 +504,20 @@ Value FormulaEvaluator::evaluate(const FormulaExpr& e, const Value* record, cons
         const Value a = evaluate(*e.children[0], record, now);
         return a.isNull() ? Value() : Value::boolean(!a.toBoolean());
     }
-    case Kind::And: {
-        const Value a = evaluate(*e.children[0], record, now);
-        if (!a.isNull() && !a.toBoolean())
-            return Value::boolean(false);
-        const Value b = evaluate(*e.children[1], record, now);
-        if (!b.isNull() && !b.toBoolean())
-            return Value::boolean(false);
-        if (a.isNull() || b.isNull())
-            return {};
-        return Value::boolean(true);
-    }
+    case Kind::And:
     case Kind::Or: {
-        const Value a = evaluate(*e.children[0], record, now);
-        if (!a.isNull() && a.toBoolean())
-            return Value::boolean(true);
-        const Value b = evaluate(*e.children[1], record, now);
-        if (!b.isNull() && b.toBoolean())
-            return Value::boolean(true);
-        if (a.isNull() || b.isNull())
-            return {};
-        return Value::boolean(false);
+        // Left to right, stopping at the first operand that decides; a Null operand that
+        // decides nothing makes the result Null, as SQL's three-valued logic does.
+        const bool deciding = e.kind == Kind::Or;
+        bool sawNull = false;
+        for (const auto& child : e.children) {
+            const Value v = evaluate(*child, record, now);
+            if (v.isNull())
+                sawNull = true;
+            else if (v.toBoolean() == deciding)
+                return Value::boolean(deciding);
+        }
+        return sawNull ? Value() : Value::boolean(!deciding);
     }
     case Kind::Arithmetic: {
         const Value a = evaluate(*e.children[0], record, now);

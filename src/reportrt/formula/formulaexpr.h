@@ -88,6 +88,9 @@ struct FormulaExpr {
     ValueType type = ValueType::Null;
     bool isArray = false; // a List, or a parameter that allows several values
     bool isConstant = false; // no field in it: the same value for every record
+    // A parameter's value is in it, also after folding: such a condition holds for this
+    // run's values only and must not be written into a statement that outlives the run.
+    bool usesParameter = false;
     int column = -1; // Field: index of the record column
 };
 

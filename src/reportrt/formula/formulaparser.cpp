@@ -372,7 +372,8 @@ private:
         Parser& m_parser;
     };
 
-    /// Left-associative chains ("a And b And c...") nest one level per operator.
+    /// Left-associative arithmetic and concatenation chains ("a + b + c...") build a tree one
+    /// level deeper per operator, so each operator counts as a level of nesting.
     struct ChainGuard {
         ChainGuard(Parser& parser)
             : m_parser(parser)
@@ -411,30 +412,30 @@ private:
     ExprPtr orExpression()
     {
         DepthGuard guard(*this);
-        ExprPtr left = andExpression();
-        ChainGuard chain(*this);
-        while (isKeyword(u"or")) {
-            chain.next();
-            const TextPosition where = m_token.position;
-            advance();
-            left = binary(FormulaExpr::Kind::Or, FormulaExpr::Op::None, where, std::move(left),
-                andExpression());
-        }
-        return left;
+        return logicalChain(FormulaExpr::Kind::Or, u"or", [this] { return andExpression(); });
     }
 
     ExprPtr andExpression()
     {
-        ExprPtr left = notExpression();
-        ChainGuard chain(*this);
-        while (isKeyword(u"and")) {
-            chain.next();
-            const TextPosition where = m_token.position;
+        return logicalChain(FormulaExpr::Kind::And, u"and", [this] { return notExpression(); });
+    }
+
+    /// "a Or b Or c..." as one node with every operand as a child: hosts write selections
+    /// of thousands of terms, which a tree of two-operand nodes would make as deep as they
+    /// are long. The node sits at the first operator.
+    template <typename Operand>
+    ExprPtr logicalChain(FormulaExpr::Kind kind, const char16_t* keyword, Operand operand)
+    {
+        ExprPtr first = operand();
+        if (!isKeyword(keyword))
+            return first;
+        auto chain = node(kind, m_token.position);
+        chain->children.push_back(std::move(first));
+        while (isKeyword(keyword)) {
             advance();
-            left = binary(FormulaExpr::Kind::And, FormulaExpr::Op::None, where, std::move(left),
-                notExpression());
+            chain->children.push_back(operand());
         }
-        return left;
+        return chain;
     }
 
     ExprPtr notExpression()

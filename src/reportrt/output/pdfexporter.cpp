@@ -1,5 +1,6 @@
 #include "reportrt/output/pdfexporter.h"
 
+#include "reportrt/base/durablefile_p.h"
 #include "reportrt/base/runtimeerror.h"
 #include "reportrt/layout/pagination.h"
 #include "reportrt/output/allocatortuning_p.h"
@@ -11,7 +12,6 @@
 #include <QPageLayout>
 #include <QPainter>
 #include <QPdfWriter>
-#include <QSaveFile>
 #include <condition_variable>
 #include <deque>
 #include <mutex>
@@ -94,9 +94,9 @@ struct Job {
 /// The painting thread: everything that touches the file and the PDF writer runs here.
 void paint(Job& job)
 {
-    QSaveFile file(job.path);
-    if (!file.open(QIODevice::WriteOnly)) {
-        job.error = file.errorString();
+    DurableFile file(job.path);
+    if (!file.start()) {
+        job.error = file.failure();
         job.queue.abort();
         return;
     }
@@ -116,7 +116,7 @@ void paint(Job& job)
             if (!painter.begin(&writer)) {
                 job.error = QStringLiteral("the PDF writer could not start");
                 job.queue.abort();
-                file.cancelWriting();
+                file.abandon();
                 return;
             }
             first = false;
@@ -130,11 +130,11 @@ void paint(Job& job)
     if (painter.isActive())
         painter.end();
     if (job.queue.isAborted() || first) {
-        file.cancelWriting();
+        file.abandon();
         return;
     }
-    if (!file.commit())
-        job.error = file.errorString();
+    if (!file.finish())
+        job.error = file.failure();
 }
 
 /// Thrown through the layout when the painting thread stopped.
