@@ -1,0 +1,13 @@
+#include "reportslogging_p.h"
+
+#include "engine/moxglobals.h"
+
+namespace reports {
+Q_LOGGING_CATEGORY(lcReports, "ludmox.reports", QtWarningMsg)
+
+void traceReport(const QString& message)
+{
+    engine::TraceWrite(message, QString(), false);
+    qCDebug(lcReports, "%ls", qUtf16Printable(message));
+}
+} // namespace reports
