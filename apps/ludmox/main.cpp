@@ -7,8 +7,8 @@
 //   ludmox printers
 
 #include "core/comerror.h"
-#include "printcommand.h"
 #include "core/variant.h"
+#include "printcommand.h"
 #include "reportrt/install.h"
 #include "reportrt/report.h"
 #include "runtime/databasetable.h"
@@ -17,11 +17,11 @@
 #include "runtime/reportobject.h"
 #include "runtime/section.h"
 
+#include <QApplication>
 #include <QCommandLineParser>
 #include <QDir>
 #include <QElapsedTimer>
 #include <QFileInfo>
-#include <QApplication>
 #include <cstdio>
 
 namespace {

@@ -119,10 +119,9 @@ int printReport(const QCommandLineParser& parser)
     }
 
     // Nobody answers a dialog on the command line.
-    const auto previous = reports::SetInputBoxPresenter(
-        [](const std::shared_ptr<dialogs::InputBoxParams>&, int32_t, const QString&, int32_t) {
-            return false;
-        });
+    const auto previous
+        = reports::SetInputBoxPresenter([](const std::shared_ptr<dialogs::InputBoxParams>&, int32_t,
+                                            const QString&, int32_t) { return false; });
     int code = 0;
     try {
         const auto moxEngine = std::make_shared<engine::MoxEngine115>();

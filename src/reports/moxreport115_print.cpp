@@ -17,6 +17,7 @@
 #include "runtime/report.h"
 
 #include <QApplication>
+#include <QWindow>
 #include <optional>
 
 using namespace Qt::StringLiterals;

@@ -1,6 +1,5 @@
-#include "reportslogging_p.h"
-
 #include "engine/moxglobals.h"
+#include "reportslogging_p.h"
 
 namespace reports {
 Q_LOGGING_CATEGORY(lcReports, "ludmox.reports", QtWarningMsg)

@@ -160,8 +160,8 @@ TEST_F(ReportPictures, PictureBytesAreCopiedAndChecked)
     const Case cases[] = {
         { "a value above a byte", core::VariantArray::fromList({ int32_t(1), int32_t(256) }), 6 },
         { "text that is no number", core::VariantArray::fromList({ u"x"_s }), 13 },
-        { "a table of bytes",
-            core::VariantArray({ { 0, 1 }, { 0, 1 } }, core::VariantType::Byte), 13 },
+        { "a table of bytes", core::VariantArray({ { 0, 1 }, { 0, 1 } }, core::VariantType::Byte),
+            13 },
     };
     for (const Case& c : cases) {
         SCOPED_TRACE(c.name);
@@ -298,8 +298,8 @@ TEST_F(ReportPictures, StoredImagesAreFittedIntoTheirBoxAndCentred)
         ASSERT_TRUE(load(*moxReport));
 
         section->fireFormat();
-        EXPECT_EQ(QRect(object->state.left, object->state.top, object->state.width,
-                      object->state.height),
+        EXPECT_EQ(
+            QRect(object->state.left, object->state.top, object->state.width, object->state.height),
             c.expected);
     }
 }

@@ -69,7 +69,7 @@ protected:
         ReportTest::SetUp();
         ASSERT_TRUE(m_folder.isValid());
         m_previousPrinters = qgetenv("LUDMOX_PDF_PRINTERS");
-        qputenv("LUDMOX_PDF_PRINTERS", ("Archive=" + m_folder.filePath(u"archive"_s)).toUtf8());
+        qputenv("LUDMOX_PDF_PRINTERS", (u"Archive="_s + m_folder.filePath(u"archive"_s)).toUtf8());
         platform::CurrentPrinter::instance().select(platform::Printers::virtualPdfPrinter());
         m_devMode = engine::DevMode();
         engine::DevMode().dmPaperSize = 8;
@@ -109,10 +109,8 @@ protected:
         return result;
     }
 
-    QString archiveFolder() const
-    {
-        return QDir::cleanPath(m_folder.filePath(u"archive"_s));
-    }
+public:
+    QString archiveFolder() const { return QDir::cleanPath(m_folder.filePath(u"archive"_s)); }
     static QString pdfPrinter()
     {
         const auto pdf = platform::Printers::virtualPdfPrinter();
@@ -124,6 +122,7 @@ protected:
         return u"selectPrinter(\"ludmox-pdf\",\"Archive\",\"%1\")"_s.arg(archiveFolder());
     }
 
+protected:
     QTemporaryDir m_folder;
 
 private:
@@ -156,25 +155,23 @@ TEST_F(ReportPrint, SilentPrintChoosesPrinterAndPaper)
                     u"setPaperSize(9)"_s, u"setPaperSource(2)"_s, u"setPrinterDuplex(3)"_s,
                     u"printOut(False,1,True)"_s };
             } },
-        { "a host's printer that is not installed keeps the report's", {}, u"Nowhere"_s, 9,
-            true, 2, 1,
+        { "a host's printer that is not installed keeps the report's", {}, u"Nowhere"_s, 9, true, 2,
+            1,
             [](const ReportPrint&) {
                 return QStringList { u"setPaperOrientation(2)"_s, u"setPaperSize(1)"_s,
-                    u"setPaperSource(2)"_s, u"setPrinterDuplex(3)"_s,
-                    u"printOut(False,1,True)"_s };
+                    u"setPaperSource(2)"_s, u"setPrinterDuplex(3)"_s, u"printOut(False,1,True)"_s };
             } },
-        { "the keyword keeps the report's own printer and paper", u"Please UseReportPrinter."_s,
-            {}, 0, false, 2, 1,
+        { "the keyword keeps the report's own printer and paper", u"Please UseReportPrinter."_s, {},
+            0, false, 2, 1,
             [](const ReportPrint&) { return QStringList { u"printOut(False,1,True)"_s }; } },
-        { "a host's printer overrides the keyword", u"usereportprinter"_s, u"Archive"_s, 0,
-            false, 2, 1,
+        { "a host's printer overrides the keyword", u"usereportprinter"_s, u"Archive"_s, 0, false,
+            2, 1,
             [](const ReportPrint&) {
                 return QStringList { pdfPrinter(), u"setPaperOrientation(2)"_s,
                     u"setPaperSize(1)"_s, pdfPrinter(), u"setPaperSource(2)"_s,
                     u"setPrinterDuplex(3)"_s, u"printOut(False,1,True)"_s };
             } },
-        { "the host's paper for the application's printer", {}, u"lud mox pdf"_s, 11, false, 2,
-            1,
+        { "the host's paper for the application's printer", {}, u"lud mox pdf"_s, 11, false, 2, 1,
             [](const ReportPrint&) {
                 return QStringList { pdfPrinter(), u"setPaperOrientation(2)"_s,
                     u"setPaperSize(11)"_s, pdfPrinter(), u"setPaperSource(2)"_s,
@@ -183,8 +180,7 @@ TEST_F(ReportPrint, SilentPrintChoosesPrinterAndPaper)
         { "a report without paper takes the shared settings' paper", {}, {}, 0, false, 0, 0,
             [](const ReportPrint&) {
                 return QStringList { pdfPrinter(), pdfPrinter(), u"setPaperSize(8)"_s,
-                    u"setPaperSource(2)"_s, u"setPrinterDuplex(3)"_s,
-                    u"printOut(False,1,True)"_s };
+                    u"setPaperSource(2)"_s, u"setPrinterDuplex(3)"_s, u"printOut(False,1,True)"_s };
             } },
     };
     for (const Case& c : cases) {
@@ -243,8 +239,8 @@ TEST_F(ReportPrint, ADialogsChoiceStaysForLaterSilentPrints)
     fake.clearLog();
     ASSERT_TRUE(report->PrintReport(false, 1, true, 0, 0, true));
     ASSERT_TRUE(report->PrintReport(false));
-    EXPECT_EQ(printerCalls(),
-        (QStringList { u"printOut(False,1,True)"_s, u"printOut(False,1,True)"_s }));
+    EXPECT_EQ(
+        printerCalls(), (QStringList { u"printOut(False,1,True)"_s, u"printOut(False,1,True)"_s }));
 
     // Closing the report does not forget the choice.
     report->CloseReport();
@@ -265,14 +261,16 @@ TEST_F(ReportPrint, PrintOutArgumentsFollowTheRequest)
         QStringList expected;
     };
     const Case cases[] = {
-        { "no copies print one", 0, true, 0, 0, false, { u"printOut(False,1,True)"_s } },
-        { "negative copies print one", -3, false, 0, 0, false, { u"printOut(False,1,False)"_s } },
+        { "no copies print one", 0, true, 0, 0, false,
+            { u"Report(orders.rpt).printOut(False,1,True)"_s } },
+        { "negative copies print one", -3, false, 0, 0, false,
+            { u"Report(orders.rpt).printOut(False,1,False)"_s } },
         { "a range with an open end prints everything", 2, true, 3, 0, false,
-            { u"printOut(False,2,True)"_s } },
+            { u"Report(orders.rpt).printOut(False,2,True)"_s } },
         { "a range without start prints everything", 2, true, 0, 4, false,
-            { u"printOut(False,2,True)"_s } },
+            { u"Report(orders.rpt).printOut(False,2,True)"_s } },
         { "a closed range is passed on", 3, false, 2, 4, false,
-            { u"printOut(False,3,False,2,4)"_s } },
+            { u"Report(orders.rpt).printOut(False,3,False,2,4)"_s } },
         { "a drill-down print only prepares", 2, true, 2, 4, true, {} },
     };
     for (const Case& c : cases) {
@@ -316,8 +314,7 @@ TEST_F(ReportPrint, TracesEveryStepInOrder)
             (QStringList { u"MoxReport.PrintReport_BeforeSetParameters"_s,
                 u"MoxReport.PrintReport_BeforeSetSQLSelection"_s,
                 u"MoxReport.PrintReport_BeforeReadRecords"_s,
-                u"MoxReport.PrintReport_RecordsRead"_s,
-                u"MoxReport.PrintReport_BeforePrintOut00"_s,
+                u"MoxReport.PrintReport_RecordsRead"_s, u"MoxReport.PrintReport_BeforePrintOut00"_s,
                 u"MoxReport.PrintReport_AfterPrintOut00"_s, u"MoxReport.PrintReport_DoExit"_s }));
     }
     {
@@ -369,8 +366,8 @@ TEST_F(ReportPrint, ErrorsReachTheHostWithTheirNumbers)
             u"Bad source"_s, RuntimeFailure },
         { "a printer that cannot be selected", u"Report.selectPrinter"_s, RuntimeFailure,
             u"No printer"_s, RuntimeFailure },
-        { "a refused duplex mode", u"Report.setPrinterDuplex"_s, RuntimeFailure,
-            u"Bad duplex"_s, RuntimeFailure },
+        { "a refused duplex mode", u"Report.setPrinterDuplex"_s, RuntimeFailure, u"Bad duplex"_s,
+            RuntimeFailure },
         { "the summary that cannot be read", u"Report.summaryComments"_s, RuntimeFailure,
             u"Unreadable"_s, RuntimeFailure },
     };
@@ -404,8 +401,8 @@ TEST_F(ReportPrint, ReportsThatCannotLoad)
     } catch (const core::ComError& error) {
         EXPECT_EQ(error.number(), UserCancelled);
         EXPECT_EQ(error.source(), u"LUD Crystal Engine"_s);
-        EXPECT_EQ(error.description(),
-            u"Not an OLE DB report - please convert with Crystal Reports."_s);
+        EXPECT_EQ(
+            error.description(), u"Not an OLE DB report - please convert with Crystal Reports."_s);
     }
     EXPECT_THROW(report->PrinterSetup(0), core::ComError);
 
