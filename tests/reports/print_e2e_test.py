@@ -97,7 +97,8 @@ class PrintThroughLudmoxd(unittest.TestCase):
         engine.SetLogonInfo(ECST_MSJET, self.database, "", "admin", "")
         engine.SetProperties("DeviceName", "LUD Mox PDF")
         self.engine = engine
-        self.report = engine.GetReports().Item(self.report_file)
+        self.reports = engine.GetReports()  # the report reaches its engine through it
+        self.report = self.reports.Item(self.report_file)
 
     def printed(self, folder):
         files = sorted(glob.glob(os.path.join(folder, "*.pdf")), key=os.path.getmtime)
