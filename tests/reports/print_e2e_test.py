@@ -13,6 +13,7 @@ import sqlite3
 import struct
 import subprocess
 import tempfile
+import time
 import unittest
 import zlib
 
@@ -151,6 +152,45 @@ class PrintThroughLudmoxd(unittest.TestCase):
         self.assertTrue(info["Page size"].strip().startswith("595.276 x 419.528")
                         or info["Page size"].strip().startswith("595 x 420"), info["Page size"])
         self.assertFalse(glob.glob(os.path.join(self.pdf_folder, "*.pdf")))
+
+    def test_a_cups_queue_gets_the_job_options(self):
+        queue = os.environ.get("LUDMOX_CUPS_QUEUE", "LUDMox-CUPS")
+        out = os.environ.get("LUDMOX_CUPS_PDF_DIR", "/var/spool/cups-pdf-ludmox")
+        ready = (shutil.which("lpstat") and shutil.which("ipptool") and subprocess.run(
+            ["lpstat", "-p", queue], capture_output=True).returncode == 0)
+        if not ready:
+            if os.environ.get("LUDMOX_REQUIRE_CUPS"):
+                self.fail("the CUPS queue %s is not there (scripts/start-services.sh)" % queue)
+            self.skipTest("no CUPS queue " + queue)
+        before = set(glob.glob(os.path.join(out, "*.pdf")))
+        self.report.DefaultPrinter = queue
+        self.report.DefaultPaperSize = 11  # A5
+        self.assertTrue(self.report.PrintReport(False, 2, True, 2, 3, True))
+        jobs = subprocess.run(["lpstat", "-W", "all", "-o", queue], capture_output=True,
+                              text=True, check=True).stdout.split()
+        job = max(int(word.rsplit("-", 1)[1]) for word in jobs if word.startswith(queue + "-"))
+        attributes = {}
+        for _ in range(60):
+            listing = subprocess.run(
+                ["ipptool", "-tv", "ipp://localhost/jobs/%d" % job,
+                 "/usr/share/cups/ipptool/get-job-attributes.test"],
+                capture_output=True, text=True).stdout
+            attributes = dict(
+                (line.split("(")[0].strip(), line.split("=", 1)[1].strip())
+                for line in listing.splitlines() if " = " in line)
+            if attributes.get("job-state") == "completed":
+                break
+            time.sleep(0.5)
+        self.assertEqual(attributes.get("copies"), "2")
+        self.assertEqual(attributes.get("Collate"), "true")
+        self.assertEqual(attributes.get("page-ranges"), "2-3")
+        self.assertEqual(attributes.get("media"), "A5")
+        self.assertEqual(attributes.get("job-state"), "completed")
+        written = set(glob.glob(os.path.join(out, "*.pdf"))) - before
+        self.assertEqual(len(written), 1)
+        info = pdf_info(written.pop())
+        self.assertEqual(int(info["Pages"]), 4)
+        self.assertIn("A5", info["Page size"])
 
 
 if __name__ == "__main__":
