@@ -1,6 +1,7 @@
 #!/usr/bin/env bash
-# The main job: builds LUD Mox, makes the sample database and exports every sample report
-# in examples/reports to PDF with the ludmox host.
+# The main job: builds LUD Mox, makes the sample database, exports every sample report in
+# examples/reports to PDF with the ludmox host, and prints the invoices (the customer's logo
+# and the product pictures of the file store) through the component on its PDF printer.
 #
 #   bash scripts/run-examples.sh [output folder]     (default: out/examples)
 set -euo pipefail
@@ -18,4 +19,8 @@ mkdir -p "$output"
 python3 examples/make_sample_db.py --output "$output/sample.db"
 "$build_dir/apps/ludmox/ludmox" export --database "$output/sample.db" --output "$output" \
     --reports examples/reports
-echo "PDF files are in $output"
+LUDMOX_PDF_PRINTER_DIR="$output/printed" "$build_dir/apps/ludmox/ludmox" print \
+    --database "$output/sample.db" --printer "LUD Mox PDF" \
+    --param FromOrder=1 --param ToOrder=3 --param InvoiceDate=2026-12-06 --param DueDays=14 \
+    --param "Note=Thank you for your order." examples/reports/invoice.rpt
+echo "PDF files are in $output, printed invoices in $output/printed"

@@ -12,6 +12,7 @@ packages=(
     python3 poppler-utils qpdf
     postgresql postgresql-client
     fonts-dejavu-core xvfb xauth
+    cups cups-bsd cups-client printer-driver-cups-pdf
 )
 
 missing=()

@@ -42,4 +42,49 @@ start_postgresql() {
     echo "start-services: PostgreSQL $version/$cluster on 127.0.0.1:$port, database $database"
 }
 
+# CUPS with a print queue on the cups-pdf backend, so printing goes the way a user's printer
+# takes it: Qt's printer, a CUPS job, a PDF file written by the backend. The queue is
+# LUDMOX_CUPS_QUEUE ("LUDMox-CUPS") and the backend writes into LUDMOX_CUPS_PDF_DIR
+# (/var/spool/cups-pdf-ludmox). cupsd is started directly: CI has no service manager.
+start_cups() {
+    local queue=${LUDMOX_CUPS_QUEUE:-LUDMox-CUPS}
+    local out=${LUDMOX_CUPS_PDF_DIR:-/var/spool/cups-pdf-ludmox}
+    if ! command -v cupsd >/dev/null 2>&1 || [ ! -e /usr/lib/cups/backend/cups-pdf ]; then
+        echo "start-services: CUPS or cups-pdf is not installed (scripts/setup-debian.sh installs them)" >&2
+        return 1
+    fi
+    local sudo_cmd=""
+    [ "$(id -u)" -eq 0 ] || sudo_cmd="sudo"
+    $sudo_cmd mkdir -p "$out"
+    $sudo_cmd chmod 1777 "$out"
+    # The backend reads /etc/cups/cups-pdf-<name>.conf for the URI cups-pdf:/<name>.
+    $sudo_cmd tee /etc/cups/cups-pdf-ludmox.conf >/dev/null <<CONF
+Out $out
+AnonDirName $out
+Label 0
+UserUMask 0000
+Grp lpadmin
+DecodeHexStrings 1
+CONF
+    if ! lpstat -r >/dev/null 2>&1 || lpstat -r 2>&1 | grep -q "not running"; then
+        $sudo_cmd mkdir -p /run/cups
+        $sudo_cmd cupsd
+    fi
+    for _ in $(seq 1 30); do
+        lpstat -r 2>/dev/null | grep -q "is running" && break
+        sleep 1
+    done
+    lpstat -r | grep -q "is running"
+    if ! lpstat -p "$queue" >/dev/null 2>&1; then
+        $sudo_cmd lpadmin -p "$queue" -E -v cups-pdf:/ludmox \
+            -P /usr/share/ppd/cups-pdf/CUPS-PDF_opt.ppd -D "LUD Mox test printer"
+    fi
+    $sudo_cmd cupsenable "$queue"
+    $sudo_cmd cupsaccept "$queue"
+    # Completed jobs stay listed with their attributes for the tests to read.
+    $sudo_cmd cupsctl PreserveJobHistory=Yes PreserveJobFiles=No >/dev/null 2>&1 || true
+    echo "start-services: CUPS queue $queue writes PDF files into $out"
+}
+
 start_postgresql
+start_cups

@@ -2,10 +2,13 @@
 // does and exports or prints reports from the shell.
 //
 //   ludmox export --database DB --output DIR [--param NAME=VALUE]... [REPORT.rpt]...
-//   ludmox print --database DB [--printer NAME] [--copies N] [--pages FROM-TO] REPORT.rpt
+//   ludmox print --database DB [--printer NAME] [--copies N] [--pages FROM-TO] [--paper CODE]
+//                [--param NAME=VALUE]... REPORT.rpt
+//   ludmox printers
 
 #include "core/comerror.h"
 #include "core/variant.h"
+#include "printcommand.h"
 #include "reportrt/output/registerruntime.h"
 #include "reportrt/report.h"
 #include "runtime/databasetable.h"
@@ -14,11 +17,11 @@
 #include "runtime/reportobject.h"
 #include "runtime/section.h"
 
+#include <QApplication>
 #include <QCommandLineParser>
 #include <QDir>
 #include <QElapsedTimer>
 #include <QFileInfo>
-#include <QGuiApplication>
 #include <cstdio>
 
 namespace {
@@ -141,7 +144,9 @@ int main(int argc, char* argv[])
     if (qEnvironmentVariableIsEmpty("DISPLAY") && qEnvironmentVariableIsEmpty("WAYLAND_DISPLAY")
         && qEnvironmentVariableIsEmpty("QT_QPA_PLATFORM"))
         qputenv("QT_QPA_PLATFORM", "offscreen");
-    QGuiApplication application(argc, argv);
+    // A widget application: the component's windows (message boxes, dialog owners) are
+    // widgets, even where the command line never shows one.
+    QApplication application(argc, argv);
     QGuiApplication::setApplicationName(QStringLiteral("ludmox"));
     reportrt::registerRuntime();
 
@@ -158,11 +163,16 @@ int main(int argc, char* argv[])
         QStringLiteral("folder"), QStringLiteral("examples/reports") });
     parser.addOption({ QStringLiteral("param"),
         QStringLiteral("A parameter value for every report."), QStringLiteral("name=value") });
+    ludmox::addPrintOptions(parser);
     parser.process(application);
 
     const QStringList arguments = parser.positionalArguments();
     if (arguments.value(0) == u"export")
         return exportReports(parser);
+    if (arguments.value(0) == u"print")
+        return ludmox::printReport(parser);
+    if (arguments.value(0) == u"printers")
+        return ludmox::listPrinters();
     printError(QStringLiteral("unknown command %1; try --help").arg(arguments.value(0)));
     return 2;
 }

@@ -65,6 +65,16 @@ void registerMoxReport115(Registry& registry)
         { optionalParam(QStringLiteral("DontResetParameters"), false) });
     c.method(QStringLiteral("CloseReport8"), 0x60030010, &MoxReport115::CloseReport8);
 
+    c.method(QStringLiteral("PrintReport"), 0x60030011, &MoxReport115::PrintReport,
+        { param(QStringLiteral("ShowDialog")), optionalParam(QStringLiteral("Copies"), int16_t(1)),
+            optionalParam(QStringLiteral("Collate"), true),
+            optionalParam(QStringLiteral("StartPage"), int16_t(0)),
+            optionalParam(QStringLiteral("StopPage"), int16_t(0)),
+            optionalParam(QStringLiteral("UseDefaultPrinter"), false),
+            optionalParam(QStringLiteral("DrillDownPrint"), false) });
+    c.method(QStringLiteral("PrinterSetup"), 0x60030012, &MoxReport115::PrinterSetup,
+        { optionalParam(QStringLiteral("hWndParent"), int32_t(0)) });
+
     c.method(QStringLiteral("SetSelection"), 0x60030013, &MoxReport115::SetSelection,
         { param(QStringLiteral("TableName")), param(QStringLiteral("Selection")),
             optionalParam(QStringLiteral("SpecialSelection")) });
@@ -91,6 +101,11 @@ void registerMoxReport115(Registry& registry)
               QStringLiteral("Params"), core::Variant::missing(), QStringLiteral("Object")),
             optionalParam(QStringLiteral("Buttons")), optionalParam(QStringLiteral("Title")),
             optionalParam(QStringLiteral("Result")) });
+
+    c.property<QString>(
+        QStringLiteral("OlePath"), 0x68030020, &MoxReport115::OlePath, &MoxReport115::OlePath);
+    c.property<core::VariantArray>(QStringLiteral("PictureBytes"), 0x68030021,
+        &MoxReport115::PictureBytes, &MoxReport115::PictureBytes);
     registry.add(c.take());
 }
 

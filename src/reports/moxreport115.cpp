@@ -435,21 +435,6 @@ void MoxReport115::mReport_NoData(bool& pCancel)
     d->NoData = !d->IgnoreNoDataCheck;
 }
 
-void MoxReport115::mSection_format()
-{
-    engine::TraceWrite(u"mSection_format"_s, QString(), false);
-}
-
-void MoxReport115::mPictureSection_format()
-{
-    engine::TraceWrite(u"mPictureSection_format"_s, QString(), false);
-}
-
-void MoxReport115::mBlobPictureSection_format()
-{
-    engine::TraceWrite(u"mPictureSection_format"_s, QString(), false);
-}
-
 bool MoxReport115::ReloadKeepingParameters(bool KeepNothing)
 {
     if (KeepNothing) {

@@ -3,6 +3,7 @@
 #include "core/object.h"
 #include "core/variant.h"
 
+#include <QImage>
 #include <QString>
 #include <cstdint>
 #include <memory>
@@ -148,6 +149,34 @@ public:
     core::Variant ShowLUDInputBox(
         core::Variant& Params, int32_t& Buttons, QString& Title, bool& Result);
 
+    // Printing and pictures.
+
+    /// Prints the report: loads it, chooses the printer and paper (a printer chosen in a
+    /// dialog stays; "usereportprinter" in the summary comments keeps the report's own;
+    /// DefaultPrinter with UseDefaultPrinter or a dialog names one; else the application's
+    /// current printer with the shared printer settings), applies parameters and selection,
+    /// reads the records and prints, behind the print dialog when ShowDialog. Copies below 1
+    /// print one copy; the page range is used only when both ends are non-zero.
+    /// DrillDownPrint does everything but print. False only when the report cannot be
+    /// loaded; a report not read through OLE DB raises 0x80040099, and every error after the
+    /// load reaches the caller (0x80047E52 without "0x80004005" in its text as 0x80047E53).
+    bool PrintReport(bool ShowDialog, int16_t Copies = 1, bool Collate = true,
+        int16_t StartPage = 0, int16_t StopPage = 0, bool UseDefaultPrinter = false,
+        bool DrillDownPrint = false);
+    /// Shows the print set-up dialog for this report over hWndParent; what the user chooses
+    /// stays with the report. True when shown, false on any runtime error (not raised) or
+    /// when the report cannot be loaded; a report not read through OLE DB raises 0x80040099.
+    bool PrinterSetup(int32_t hWndParent = 0);
+
+    /// Path of the picture file shown in the report's OLE object; wins over PictureBytes.
+    QString OlePath() const;
+    void OlePath(const QString& value);
+    /// Image file contents shown in the report's OLE object when OlePath is empty; one
+    /// element (the initial array) means none. Let copies the array, converting every
+    /// element to a byte (errors 6 and 13 leave the bytes as they were).
+    core::VariantArray PictureBytes() const;
+    void PictureBytes(const core::VariantArray& value);
+
     // Internal operations for the component's own objects.
 
     /// Set once by the collection right after creating the report.
@@ -191,6 +220,8 @@ private:
     void mSection_format();
     void mPictureSection_format();
     void mBlobPictureSection_format();
+    /// The picture in image file contents (any format Qt reads); null when none.
+    static QImage PictureFromBytes(const core::VariantArray& bytes);
 
     // Selection.
     void ApplySqlSelection();

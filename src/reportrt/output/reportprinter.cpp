@@ -14,6 +14,8 @@
 
 #include <QFileInfo>
 #include <QPainter>
+#include <QPrintEngine>
+#include <map>
 
 namespace reportrt {
 
@@ -38,6 +40,29 @@ QString documentName(const Report& report)
     name = name.left(name.indexOf(u'#') < 0 ? name.size() : name.indexOf(u'#'));
     const QString base = QFileInfo(name).completeBaseName();
     return base.isEmpty() ? QStringLiteral("Report") : base;
+}
+
+/// The print engine property that carries further job options to a CUPS queue, as a list
+/// of names and values.
+const auto cupsOptionsKey = QPrintEngine::PrintEnginePropertyKey(0xfe00);
+
+/// The job options of a print queue beyond what QPrinter passes itself.
+QStringList spoolerOptions(
+    const std::optional<runtime::PageRange>& pages, const platform::PrintSettings& settings)
+{
+    QStringList options;
+    if (pages)
+        options << QStringLiteral("page-ranges")
+                << QStringLiteral("%1-%2").arg(pages->startPage).arg(pages->stopPage);
+    // The trays that IPP names; printer-specific bins stay with the queue's default.
+    static const std::map<int16_t, QString> trays { { 1, QStringLiteral("top") },
+        { 2, QStringLiteral("bottom") }, { 3, QStringLiteral("middle") },
+        { 4, QStringLiteral("manual") }, { 5, QStringLiteral("envelope") },
+        { 7, QStringLiteral("auto") }, { 11, QStringLiteral("large-capacity") } };
+    const auto tray = trays.find(settings.paperBin());
+    if (tray != trays.end())
+        options << QStringLiteral("media-source") << tray->second;
+    return options;
 }
 
 /// Keeps what the user chose in a print dialog with the report.
@@ -152,6 +177,15 @@ void ReportPrinter::printOut(Report& report, bool promptUser, int16_t copies, bo
 
     tuneAllocatorForPdf();
     const auto device = platform::PrinterDevice::create(printer, settings, documentName(report));
+    // A print queue takes copies, collation, the page range and the tray as job options, so
+    // the spooler and the printer see them as the user asked (and count one document).
+    const bool spooled = !printer.isVirtualPdf();
+    if (spooled) {
+        device->setCopyCount(count);
+        device->setCollateCopies(collated);
+        device->printEngine()->setProperty(cupsOptionsKey, spoolerOptions(pages, settings));
+        count = 1;
+    }
     status.setProgress(runtime::PrintingProgress::InProgress);
     report.setPrintingStatus(status);
     device->setFullPage(true);
@@ -178,7 +212,7 @@ void ReportPrinter::printOut(Report& report, bool promptUser, int16_t copies, bo
         ++printed;
     };
     const auto inRange = [&](int number) {
-        return !pages || (number >= pages->startPage && number <= pages->stopPage);
+        return spooled || !pages || (number >= pages->startPage && number <= pages->stopPage);
     };
     try {
         if (collated || count == 1) {
@@ -200,7 +234,7 @@ void ReportPrinter::printOut(Report& report, bool promptUser, int16_t copies, bo
         }
         if (painter.isActive())
             painter.end();
-        if (printed == 0)
+        if (printed == 0 || (pages && pages->startPage > laidOut))
             raiseError(Error::RuntimeFailure,
                 QStringLiteral("Nothing to print: the report has %1 page(s) and the range starts "
                                "at page %2.")

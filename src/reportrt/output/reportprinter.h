@@ -17,9 +17,9 @@ class Report;
 /// file) when that printer is installed (the name compared without regard to case), and
 /// otherwise on the process's current printer. Its page set-up gives orientation, paper
 /// size, paper source and duplex mode; codes a printer does not know leave that setting
-/// at the printer's default. Copies and collation are painted by the runtime itself, so
-/// they come out the same on every printer: collated copies repeat the page range,
-/// uncollated ones repeat each page.
+/// at the printer's default. On PDF printers the runtime paints copies and collation itself
+/// (collated copies repeat the page range, uncollated ones repeat each page); a system
+/// print queue gets copies, collation, the page range and the tray as job options instead.
 class ReportPrinter {
 public:
     /// Prints the report (reading its records first when needed).
