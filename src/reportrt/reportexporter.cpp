@@ -2,8 +2,15 @@
 
 #include "exportoptions.h"
 #include "pdfexporter.h"
+#include "platform/tempfolder.h"
 #include "report.h"
+#include "reportrt/mail/maildelivery.h"
+#include "reportrt/mail/mailerror.h"
+#include "reportrt/mail/mailrequest.h"
 #include "runtimeerror.h"
+
+#include <QFileInfo>
+#include <QTemporaryFile>
 
 namespace reportrt {
 
@@ -16,6 +23,37 @@ constexpr int32_t destinationDisk = 1;
 constexpr int32_t destinationMail = 2;
 constexpr int16_t progressCompleted = 3;
 constexpr int16_t progressCancelled = 5;
+
+// Exports into a private temporary file, mails it under the report's own name and removes
+// the file on every path. Returns the page count.
+int mailReport(Report& report, const ExportOptions& options)
+{
+    QTemporaryFile attachment(
+        platform::TempFolder::systemPath() + QStringLiteral("mail-XXXXXX.pdf"));
+    if (!attachment.open())
+        raiseError(Error::ExportFailed,
+            QStringLiteral("The mail attachment could not be written in the temporary folder: %1.")
+                .arg(attachment.errorString()));
+    attachment.close();
+    const int pageCount = PdfExporter::exportTo(report, attachment.fileName());
+
+    mail::MailRequest request;
+    request.to = options.mailToList();
+    request.cc = options.mailCcList();
+    request.bcc = options.mailBccList();
+    request.subject = options.mailSubject();
+    request.message = options.mailMessage();
+    request.attachmentPath = attachment.fileName();
+    const QString baseName = QFileInfo(report.fileName()).completeBaseName();
+    request.attachmentName
+        = (baseName.isEmpty() ? QStringLiteral("report") : baseName) + QStringLiteral(".pdf");
+    try {
+        mail::MailDelivery::send(request);
+    } catch (const mail::MailError& error) {
+        raiseError(Error::MailFailed, error.description());
+    }
+    return pageCount;
+}
 } // namespace
 
 void ReportExporter::exportReport(Report& report, const ExportOptions& options, bool promptUser)
@@ -43,8 +81,7 @@ void ReportExporter::exportReport(Report& report, const ExportOptions& options, 
     case destinationDisk:
         break;
     case destinationMail:
-        raiseError(Error::RuntimeFailure,
-            QStringLiteral("Exporting to mail (destination 2) is not supported yet."));
+        break;
     default:
         raiseError(Error::RuntimeFailure,
             QStringLiteral("%1 is not an export destination (1 disk file, 2 mail).")
@@ -56,7 +93,9 @@ void ReportExporter::exportReport(Report& report, const ExportOptions& options, 
     // The no-data event cancelled the report: there is nothing to export.
     if (status.progress == progressCancelled)
         return;
-    status.pageCount = PdfExporter::exportTo(report, options.diskFileName());
+    status.pageCount = options.destinationType() == destinationMail
+        ? mailReport(report, options)
+        : PdfExporter::exportTo(report, options.diskFileName());
     status.progress = progressCompleted;
     report.setPrintingStatus(status);
 }
