@@ -251,29 +251,5 @@ TEST(MimeMessage, RecipientsAreEveryListOnce)
     EXPECT_EQ(addresses, QStringList({ u"a@x.ee"_s, u"b@x.ee"_s, u"c@x.ee"_s, u"d@x.ee"_s }));
 }
 
-struct TypeCase {
-    const char* name;
-    QString fileName;
-    QString type;
-};
-
-class ContentTypes : public testing::TestWithParam<TypeCase> { };
-
-TEST_P(ContentTypes, FollowTheExtension)
-{
-    EXPECT_EQ(MimeMessage::contentTypeFor(GetParam().fileName), GetParam().type);
-}
-
-INSTANTIATE_TEST_SUITE_P(Mail, ContentTypes,
-    testing::Values(TypeCase { "Pdf", u"a.pdf"_s, u"application/pdf"_s },
-        TypeCase { "XlsxUpperCase", u"A.XLSX"_s,
-            u"application/vnd.openxmlformats-officedocument.spreadsheetml.sheet"_s },
-        TypeCase { "Html", u"page.html"_s, u"text/html"_s },
-        TypeCase { "Htm", u"page.htm"_s, u"text/html"_s },
-        TypeCase { "OldExcel", u"a.xls"_s, u"application/vnd.ms-excel"_s },
-        TypeCase { "Unknown", u"a.rpt"_s, u"application/octet-stream"_s },
-        TypeCase { "NoExtension", u"README"_s, u"application/octet-stream"_s }),
-    caseName<TypeCase>);
-
 } // namespace
 } // namespace reportrt::mail::test

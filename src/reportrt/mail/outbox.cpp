@@ -45,8 +45,13 @@ QString Outbox::defaultFolder(const QProcessEnvironment& environment)
     const QString overridden = environment.value(QStringLiteral("LUDMOX_OUTBOX"));
     if (!overridden.isEmpty())
         return overridden;
-    return QStandardPaths::writableLocation(QStandardPaths::GenericDataLocation)
-        + QStringLiteral("/ludmox/outbox");
+    const QString data = QStandardPaths::writableLocation(QStandardPaths::GenericDataLocation);
+    // Without a home the path would start at the root of the file system.
+    if (data.isEmpty())
+        throw MailError(MailError::Kind::Outbox,
+            QStringLiteral("No mail server is configured and there is no user data folder for "
+                           "the outbox; set LUDMOX_OUTBOX or the mail server."));
+    return data + QStringLiteral("/ludmox/outbox");
 }
 
 QString Outbox::store(const QByteArray& message) const

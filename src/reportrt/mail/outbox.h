@@ -10,11 +10,12 @@ namespace reportrt::mail {
 /// file each, which a mail program opens as a message ready to send.
 class Outbox {
 public:
-    /// folder empty: defaultFolder().
+    /// folder empty: defaultFolder(), which may throw.
     explicit Outbox(const QString& folder = QString());
 
     /// LUDMOX_OUTBOX when set, else "ludmox/outbox" in the user's generic data folder
-    /// (QStandardPaths::GenericDataLocation, usually ~/.local/share).
+    /// (QStandardPaths::GenericDataLocation, usually ~/.local/share). Throws MailError
+    /// (Outbox) when there is no such folder.
     static QString defaultFolder(
         const QProcessEnvironment& environment = QProcessEnvironment::systemEnvironment());
 
