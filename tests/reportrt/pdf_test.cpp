@@ -181,7 +181,6 @@ INSTANTIATE_TEST_SUITE_P(Pdf, ExportFailures,
         FailureCase { "TargetIsAFolder", u"folder"_s, 31, 1, Error::ExportFailed, "is a folder" },
         FailureCase { "Excel", u"out.xls"_s, 38, 1, Error::RuntimeFailure, "not supported yet" },
         FailureCase { "Html", u"out.htm"_s, 32, 0, Error::RuntimeFailure, "not supported yet" },
-        FailureCase { "Mail", u"out.pdf"_s, 31, 2, Error::RuntimeFailure, "not supported yet" },
         FailureCase {
             "UnknownFormat", u"out.pdf"_s, 99, 1, Error::RuntimeFailure, "not an export format" },
         FailureCase { "UnknownDestination", u"out.pdf"_s, 31, 7, Error::RuntimeFailure,

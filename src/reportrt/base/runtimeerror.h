@@ -19,6 +19,9 @@ constexpr int32_t FormulaError = static_cast<int32_t>(0x8004768B);
 constexpr int32_t SaveFailed = static_cast<int32_t>(0x8004768C);
 /// An export file could not be written; nothing is left at the target path.
 constexpr int32_t ExportFailed = static_cast<int32_t>(0x8004768D);
+/// A report could not be mailed: bad address, unreachable server, refused credentials or
+/// recipient, timeout, or an outbox that cannot be written. Nothing was sent.
+constexpr int32_t MailFailed = static_cast<int32_t>(0x8004768E);
 constexpr int32_t RuntimeFailure = core::ErrorNumber::RuntimeFailure;
 constexpr int32_t LogOnFailed = core::ErrorNumber::LogOnFailed;
 constexpr int32_t TableConnectionFailed = core::ErrorNumber::TableConnectionFailed;

@@ -1,10 +1,17 @@
 #include "reportrt/output/reportexporter.h"
 
+#include "platform/tempfolder.h"
 #include "reportrt/base/runtimeerror.h"
 #include "reportrt/exportoptions.h"
+#include "reportrt/mail/maildelivery.h"
+#include "reportrt/mail/mailerror.h"
+#include "reportrt/mail/mailrequest.h"
 #include "reportrt/output/writertable.h"
 #include "reportrt/report.h"
 #include "runtime/exportdestination.h"
+
+#include <QFileInfo>
+#include <QTemporaryFile>
 
 namespace reportrt {
 
@@ -20,6 +27,37 @@ QString formatName(int32_t code)
         return QStringLiteral("HTML");
     }
     return {};
+}
+
+// Exports into a private temporary file, mails it under the report's own name and removes
+// the file on every path. Returns the page count.
+int mailReport(Report& report, const ExportOptions& options, const WriterTable::Writer& writer)
+{
+    QTemporaryFile attachment(
+        platform::TempFolder::systemPath() + QStringLiteral("mail-XXXXXX.pdf"));
+    if (!attachment.open())
+        raiseError(Error::ExportFailed,
+            QStringLiteral("The mail attachment could not be written in the temporary folder: %1.")
+                .arg(attachment.errorString()));
+    attachment.close();
+    const int pageCount = writer(report, options, attachment.fileName());
+
+    mail::MailRequest request;
+    request.to = options.mailToList();
+    request.cc = options.mailCcList();
+    request.bcc = options.mailBccList();
+    request.subject = options.mailSubject();
+    request.message = options.mailMessage();
+    request.attachmentPath = attachment.fileName();
+    const QString baseName = QFileInfo(report.fileName()).completeBaseName();
+    request.attachmentName
+        = (baseName.isEmpty() ? QStringLiteral("report") : baseName) + QStringLiteral(".pdf");
+    try {
+        mail::MailDelivery::send(request);
+    } catch (const mail::MailError& error) {
+        raiseError(Error::MailFailed, error.description());
+    }
+    return pageCount;
 }
 } // namespace
 
@@ -46,8 +84,7 @@ void ReportExporter::exportReport(Report& report, const ExportOptions& options, 
     case runtime::ExportDestination::DiskFile:
         break;
     case runtime::ExportDestination::Mail:
-        raiseError(Error::RuntimeFailure,
-            QStringLiteral("Exporting to mail (destination 2) is not supported yet."));
+        break;
     default:
         raiseError(Error::RuntimeFailure,
             QStringLiteral("%1 is not an export destination (1 disk file, 2 mail).")
@@ -59,7 +96,10 @@ void ReportExporter::exportReport(Report& report, const ExportOptions& options, 
     // The no-data event cancelled the report: there is nothing to export.
     if (status.is(runtime::PrintingProgress::Cancelled))
         return;
-    status.pageCount = (*writer)(report, options, options.diskFileName());
+    status.pageCount
+        = options.destinationType() == static_cast<int32_t>(runtime::ExportDestination::Mail)
+        ? mailReport(report, options, *writer)
+        : (*writer)(report, options, options.diskFileName());
     status.setProgress(runtime::PrintingProgress::Completed);
     report.setPrintingStatus(status);
 }
