@@ -1,6 +1,6 @@
 #!/usr/bin/env bash
 # The main job: builds LUD Mox, makes the sample database and exports every sample report
-# in examples/reports to PDF with the ludmox host.
+# in examples/reports to PDF with the ludmox host, and one of them to XLSX and HTML.
 #
 #   bash scripts/run-examples.sh [output folder]     (default: out/examples)
 set -euo pipefail
@@ -18,4 +18,8 @@ mkdir -p "$output"
 python3 examples/make_sample_db.py --output "$output/sample.db"
 "$build_dir/apps/ludmox/ludmox" export --database "$output/sample.db" --output "$output" \
     --reports examples/reports
-echo "PDF files are in $output"
+for format in xlsx html; do
+    "$build_dir/apps/ludmox/ludmox" export examples/reports/sales-by-country.rpt \
+        --format "$format" --database "$output/sample.db" --output "$output"
+done
+echo "PDF, XLSX and HTML files are in $output"

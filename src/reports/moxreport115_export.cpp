@@ -5,6 +5,7 @@
 #include "moxreport115.h"
 #include "moxreport115_p.h"
 #include "platform/tempfolder.h"
+#include "reportslogging_p.h"
 #include "runtime/exportoptions.h"
 #include "runtime/report.h"
 #include "stagedtarget.h"
@@ -195,7 +196,10 @@ bool MoxReport115::runExport(const ExportRequest& request)
                     || number == core::ErrorNumber::TableConnectionFailed)
                     throw core::ComError(number, error.source(), error.description());
             }
-            // The record reading's own number and text do not reach the caller.
+            // The record reading's own number and text do not reach the caller; they are
+            // kept for whoever reads the diagnostics.
+            qCWarning(lcReports, "%s: reading the records failed: %s", qUtf8Printable(d->FileName),
+                qUtf8Printable(error.lastErrorText()));
             throw core::ComError::basic(core::ErrorNumber::InvalidProcedureCall);
         }
         throw core::ComError(error.number(), error.source(),
