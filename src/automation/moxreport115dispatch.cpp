@@ -106,6 +106,28 @@ void registerMoxReport115(Registry& registry)
         QStringLiteral("OlePath"), 0x68030020, &MoxReport115::OlePath, &MoxReport115::OlePath);
     c.property<core::VariantArray>(QStringLiteral("PictureBytes"), 0x68030021,
         &MoxReport115::PictureBytes, &MoxReport115::PictureBytes);
+
+    c.method(QStringLiteral("SaveAsPDF"), 0x6003001c, &MoxReport115::SaveAsPDF,
+        { param(QStringLiteral("FileName")), optionalParam(QStringLiteral("FirstSave"), false),
+            optionalParam(QStringLiteral("TempFileOnly"), false),
+            optionalParam(QStringLiteral("ForceSave"), false) });
+    c.method(QStringLiteral("SaveAsXLS"), 0x6003001d, &MoxReport115::SaveAsXLS,
+        { param(QStringLiteral("FileName")), optionalParam(QStringLiteral("TempFileOnly"), false),
+            optionalParam(QStringLiteral("ForceSave"), false) });
+    c.method(QStringLiteral("SaveAsHTML"), 0x6003001e, &MoxReport115::SaveAsHTML,
+        { param(QStringLiteral("FileName")), optionalParam(QStringLiteral("TempFileOnly"), false),
+            optionalParam(QStringLiteral("ForceSave"), false),
+            optionalParam(QStringLiteral("SeparatePages"), true),
+            optionalParam(QStringLiteral("HTMLNavigator"), true) });
+    c.method(QStringLiteral("SendReport"), 0x6003001f, &MoxReport115::SendReport,
+        { param(QStringLiteral("Address")), optionalParam(QStringLiteral("MailSubject"), QString()),
+            optionalParam(QStringLiteral("MailMessage"), QString()),
+            byVal(optionalParam(QStringLiteral("AttachmentType"), int32_t(31))),
+            optionalParam(QStringLiteral("ShowDialog"), false),
+            optionalParam(QStringLiteral("FirstMail"), false),
+            optionalParam(QStringLiteral("CarbonCopy"), QString()),
+            optionalParam(QStringLiteral("BlindCarbonCopy"), QString()),
+            optionalParam(QStringLiteral("Attachment"), QString()) });
     registry.add(c.take());
 }
 

@@ -177,6 +177,43 @@ public:
     core::VariantArray PictureBytes() const;
     void PictureBytes(const core::VariantArray& value);
 
+    // Export and mail.
+    //
+    // Each export first writes a scratch file (TempExportFile, in the engine's temporary
+    // folder), then checks that the report read records, and only then writes FileName: as a
+    // hidden file in FileName's folder that replaces an existing (even read-only) target only
+    // once complete, so a failed export leaves the old file as it was. Without ForceSave a
+    // report without records writes nothing and returns false without an error. The
+    // arguments are in/out as the type library declares them; none is changed.
+
+    /// Writes the report as PDF. FileName is written only with ValidMail or ForceSave;
+    /// otherwise only the scratch file is made and removed. FirstSave discards the saved
+    /// data without keeping parameter values. With TempFileOnly only the scratch file is
+    /// written, at FileName (a bare name is placed in the temporary folder), and it becomes
+    /// TempExportFile. A failure sets SaveAsPDFError and raises: a failure while the records
+    /// are read as 0x80047E52 or 0x80047E44 with the runtime's text, or as error 5; any
+    /// other with its own number and source and the description followed by CR LF
+    /// "TempFile:" path CR LF "FileName:" FileName.
+    bool SaveAsPDF(QString& FileName, bool& FirstSave, bool& TempFileOnly, bool& ForceSave);
+    /// Writes the report as an Excel workbook, as SaveAsPDF does without the ValidMail rule;
+    /// a failure while the records are read raises error 5. Sets SaveAsXLSError on failure.
+    bool SaveAsXLS(QString& FileName, bool& TempFileOnly, bool& ForceSave);
+    /// Writes the report as HTML, as SaveAsXLS does; SeparatePages puts every page in its
+    /// own file and HTMLNavigator links them.
+    bool SaveAsHTML(QString& FileName, bool& TempFileOnly, bool& ForceSave, bool& SeparatePages,
+        bool& HTMLNavigator);
+    /// Mails the report to Address (";"- or ","-separated, as CarbonCopy and
+    /// BlindCarbonCopy) with the export in format AttachmentType (31 PDF, 38 Excel, 32 HTML)
+    /// attached, only while ValidMail is true. Attachment, when given, is the base name of the
+    /// attached report (a file name only: a path is refused). FirstMail discards the saved
+    /// data without keeping parameter values, as the first mail of a mass mailing does.
+    /// False without an error, with SendMailError set, on any failure or without ValidMail;
+    /// false with SendMailError clear when the report has no records. Only a failure while
+    /// the records are read raises (error 5), with SendMailError set.
+    bool SendReport(QString& Address, QString& MailSubject, QString& MailMessage,
+        int32_t AttachmentType, bool& ShowDialog, bool& FirstMail, QString& CarbonCopy,
+        QString& BlindCarbonCopy, QString& Attachment);
+
     // Internal operations for the component's own objects.
 
     /// Set once by the collection right after creating the report.
@@ -234,6 +271,22 @@ private:
     static bool IsLUDPrompt(const QString& prompt);
     void applyAnswer(runtime::ParameterField& parameter, const core::Variant& answer);
     static void applyHostValue(runtime::ParameterField& parameter, const core::Variant& value);
+
+    // Export and mail.
+    struct ExportRequest;
+    bool runExport(const ExportRequest& request);
+    /// The engine's temporary folder, ending with a separator; empty when there is none.
+    QString GetLUDTempPath() const;
+    /// The engine's owner window for the runtime's dialogs; 0 when there is none.
+    int32_t DialogParentHwnd() const;
+    /// NoData := the last read completed without a record, unless IgnoreNoDataCheck.
+    void CheckNoData();
+    /// GetLUDTempPath, or the private temporary folder when the engine has none.
+    QString scratchFolder() const;
+    /// Makes `report` the open report, with its no-data event bound to this object.
+    void adoptReport(std::shared_ptr<runtime::Report> report);
+    /// Puts the report opened from FileName back after a mail sent from a temporary copy.
+    void restoreOwnFile(const QString& temporaryReport);
 
     // The report's state lives in a private header so that the report's operations, spread
     // over several source files, share it without the public header growing with it.

@@ -1,7 +1,9 @@
 #include "layouttest.h"
 
 #include <QDir>
+#include <QFile>
 #include <QProcess>
+#include <QProcessEnvironment>
 #include <gtest/gtest.h>
 
 using namespace Qt::StringLiterals;
@@ -15,9 +17,11 @@ struct Outcome {
     QString errors;
 };
 
-Outcome ludmox(const QStringList& arguments)
+Outcome ludmox(const QStringList& arguments,
+    const QProcessEnvironment& environment = QProcessEnvironment::systemEnvironment())
 {
     QProcess process;
+    process.setProcessEnvironment(environment);
     process.start(qEnvironmentVariable("LUDMOX_CLI"), arguments);
     process.waitForFinished(300000);
     return { process.exitStatus() == QProcess::NormalExit ? process.exitCode() : -1,
@@ -71,6 +75,126 @@ TEST(Ludmox, TakesParametersAndReportsBadInput)
         EXPECT_EQ(result.exitCode, c.exitCode) << c.arguments.join(u' ').toStdString();
         EXPECT_TRUE(result.errors.contains(c.message)) << result.errors.toStdString();
     }
+}
+
+QByteArray head(const QString& path, qint64 size)
+{
+    QFile file(path);
+    return file.open(QIODevice::ReadOnly) ? file.read(size) : QByteArray();
+}
+
+QStringList everyEntry(const QString& folder)
+{
+    return QDir(folder).entryList(
+        QDir::AllEntries | QDir::Hidden | QDir::NoDotAndDotDot, QDir::Name);
+}
+
+TEST(Ludmox, ExportsThroughTheReportObjectInEveryFormat)
+{
+    struct Case {
+        QString format;
+        QString file;
+        QByteArray magic;
+    };
+    // XLSX is a zip package; HTML starts with its doctype.
+    const Case cases[] = {
+        { u"pdf"_s, u"sales-by-country.pdf"_s, "%PDF" },
+        { u"xlsx"_s, u"sales-by-country.xlsx"_s, "PK" },
+        { u"html"_s, u"sales-by-country.html"_s, "<!DOCTYPE html" },
+    };
+    for (const Case& c : cases) {
+        SCOPED_TRACE(c.format.toStdString());
+        QTemporaryDir out;
+        const Outcome result = ludmox(
+            { u"export"_s, examplesFolder() + u"/reports/sales-by-country.rpt"_s, u"--format"_s,
+                c.format, u"--output"_s, out.path(), u"--database"_s, sampleDatabase() });
+        EXPECT_EQ(result.exitCode, 0) << result.errors.toStdString();
+        EXPECT_TRUE(
+            head(out.filePath(c.file), c.magic.size()).compare(c.magic, Qt::CaseInsensitive) == 0);
+        EXPECT_EQ(everyEntry(out.path()), QStringList { c.file }) << "nothing staged is left";
+        // Standard error is no terminal here: no progress line.
+        EXPECT_FALSE(result.errors.contains(u'\r')) << result.errors.toStdString();
+    }
+}
+
+TEST(Ludmox, AFailedExportKeepsTheOldFile)
+{
+    QTemporaryDir out;
+    const QString target = out.filePath(u"sales-by-country.pdf"_s);
+    QFile old(target);
+    ASSERT_TRUE(old.open(QIODevice::WriteOnly));
+    old.write("old file");
+    old.close();
+    QFile::setPermissions(target, QFileDevice::ReadOwner);
+    const QString report = examplesFolder() + u"/reports/sales-by-country.rpt"_s;
+
+    const Outcome failed = ludmox({ u"export"_s, report, u"--output"_s, out.path(), u"--database"_s,
+        sampleDatabase(), u"--selection"_s, u"{Orders.NoSuchField} = 1"_s });
+    EXPECT_EQ(failed.exitCode, 1);
+    EXPECT_EQ(failed.errors.count(u"ludmox:"_s), 1) << failed.errors.toStdString();
+    EXPECT_TRUE(failed.errors.contains(u"NoSuchField"_s)) << "the cause, not a generic error";
+    EXPECT_EQ(head(target, 100), QByteArray("old file"));
+    EXPECT_EQ(everyEntry(out.path()), QStringList { u"sales-by-country.pdf"_s });
+
+    // A read-only target is replaced by a complete export.
+    const Outcome ok = ludmox(
+        { u"export"_s, report, u"--output"_s, out.path(), u"--database"_s, sampleDatabase() });
+    ASSERT_EQ(ok.exitCode, 0) << ok.errors.toStdString();
+    EXPECT_TRUE(qpdfCheck(target));
+}
+
+TEST(Ludmox, RefusesIncompleteCommandLines)
+{
+    QTemporaryDir out;
+    const QString invoice = examplesFolder() + u"/reports/invoice.rpt"_s;
+    struct Case {
+        const char* name;
+        QStringList arguments;
+        int exitCode;
+        QString message;
+    };
+    const Case cases[] = {
+        { "unknown format",
+            { u"export"_s, invoice, u"--format"_s, u"doc"_s, u"--output"_s, out.path(),
+                u"--database"_s, sampleDatabase() },
+            2, u"unknown format doc"_s },
+        { "no database", { u"export"_s, invoice, u"--output"_s, out.path() }, 2, u"--database"_s },
+        { "unknown option", { u"export"_s, u"--colour"_s, u"red"_s }, 2, u"colour"_s },
+        { "mail without recipients", { u"mail"_s, invoice, u"--database"_s, sampleDatabase() }, 2,
+            u"--to"_s },
+        { "mail of two reports",
+            { u"mail"_s, invoice, invoice, u"--to"_s, u"a@example.com"_s, u"--database"_s,
+                sampleDatabase() },
+            2, u"one report"_s },
+        { "mail with a path as attachment name",
+            { u"mail"_s, invoice, u"--to"_s, u"a@example.com"_s, u"--attachment"_s, u"../x"_s,
+                u"--database"_s, sampleDatabase() },
+            1, u"not a file name"_s },
+    };
+    for (const Case& c : cases) {
+        SCOPED_TRACE(c.name);
+        const Outcome result = ludmox(c.arguments);
+        EXPECT_EQ(result.exitCode, c.exitCode) << result.errors.toStdString();
+        EXPECT_TRUE(result.errors.contains(c.message)) << result.errors.toStdString();
+    }
+    const Outcome help = ludmox({ u"export"_s, u"--help"_s });
+    EXPECT_EQ(help.exitCode, 0);
+    EXPECT_TRUE(help.output.contains(u"--format"_s)) << help.output.toStdString();
+    EXPECT_TRUE(QDir(out.path()).isEmpty());
+}
+
+TEST(Ludmox, MailsToTheOutboxWithoutAServer)
+{
+    QTemporaryDir outbox;
+    QProcessEnvironment environment = QProcessEnvironment::systemEnvironment();
+    environment.remove(u"LUDMOX_SMTP_URL"_s);
+    environment.insert(u"LUDMOX_OUTBOX"_s, outbox.path());
+    const Outcome result = ludmox(
+        { u"mail"_s, examplesFolder() + u"/reports/sales-by-country.rpt"_s, u"--to"_s,
+            u"ann@example.com"_s, u"--subject"_s, u"Sales"_s, u"--database"_s, sampleDatabase() },
+        environment);
+    EXPECT_EQ(result.exitCode, 0) << result.errors.toStdString();
+    EXPECT_EQ(QDir(outbox.path()).entryList({ u"*.eml"_s }, QDir::Files).size(), 1);
 }
 
 } // namespace

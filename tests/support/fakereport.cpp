@@ -250,7 +250,9 @@ std::shared_ptr<runtime::ExportOptions> FakeReport::exportOptions()
 void FakeReport::exportReport(bool promptUser)
 {
     record(QStringLiteral("exportReport"), { arg(promptUser) });
-    if (m_exportOptions->state.destinationType == 1)
+    // Like the runtime, no destination at all means a disk file.
+    const int32_t destination = m_exportOptions->state.destinationType;
+    if (destination == 0 || destination == 1)
         writePlaceholder(m_exportOptions->state.diskFileName);
 }
 

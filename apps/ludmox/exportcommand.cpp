@@ -1,0 +1,135 @@
+#include "exportcommand.h"
+
+#include "core/comerror.h"
+#include "reporthost.h"
+#include "reports/moxreport115.h"
+#include "reports/moxstatus115.h"
+#include "runtime/report.h"
+
+#include <QCommandLineParser>
+#include <QDir>
+#include <QElapsedTimer>
+#include <QFileInfo>
+#include <cstdio>
+
+using namespace Qt::StringLiterals;
+
+namespace {
+
+struct Format {
+    QString name;
+    QString extension;
+};
+
+const Format formats[]
+    = { { u"pdf"_s, u".pdf"_s }, { u"xlsx"_s, u".xlsx"_s }, { u"html"_s, u".html"_s } };
+
+void printError(const QString& text)
+{
+    std::fputs(qPrintable(u"ludmox: "_s + text + u'\n'), stderr);
+}
+
+/// Writes `target`; false when the report has no records (the file is then still written).
+bool exportReport(reports::MoxReport115& report, const QString& format, const QString& target)
+{
+    QString fileName = target;
+    bool tempFileOnly = false;
+    // The user asked for the file: a report without records is written too.
+    bool forceSave = true;
+    if (format == u"xlsx")
+        return report.SaveAsXLS(fileName, tempFileOnly, forceSave);
+    if (format == u"html") {
+        bool separatePages = false;
+        bool navigator = false;
+        return report.SaveAsHTML(fileName, tempFileOnly, forceSave, separatePages, navigator);
+    }
+    bool firstSave = false;
+    return report.SaveAsPDF(fileName, firstSave, tempFileOnly, forceSave);
+}
+
+} // namespace
+
+int exportCommand(const QStringList& arguments)
+{
+    QCommandLineParser parser;
+    parser.setApplicationDescription(u"Writes reports as PDF, Excel or HTML files."_s);
+    parser.addHelpOption();
+    parser.addPositionalArgument(u"export"_s, u"The command."_s);
+    parser.addPositionalArgument(u"reports"_s, u"The report files to export."_s, u"REPORT..."_s);
+    parser.addOption({ u"format"_s, u"pdf (the default), xlsx or html."_s, u"format"_s, u"pdf"_s });
+    parser.addOption(
+        { u"output"_s, u"The folder for the files (made when missing)."_s, u"folder"_s });
+    parser.addOption({ u"reports"_s, u"The folder of the reports to export when none are named."_s,
+        u"folder"_s, u"examples/reports"_s });
+    ReportHost::addReportOptions(parser);
+    if (!parser.parse(arguments)) {
+        printError(parser.errorText());
+        return 2;
+    }
+    if (parser.isSet(u"help"_s))
+        parser.showHelp(0);
+
+    const QString format = parser.value(u"format"_s).toLower();
+    const auto known = std::find_if(std::begin(formats), std::end(formats),
+        [&](const Format& candidate) { return candidate.name == format; });
+    if (known == std::end(formats)) {
+        printError(u"unknown format %1; use pdf, xlsx or html"_s.arg(format));
+        return 2;
+    }
+    const QString output = parser.value(u"output"_s);
+    if (output.isEmpty() || !QDir().mkpath(output)) {
+        printError(u"cannot create the output folder %1"_s.arg(output));
+        return 2;
+    }
+    int failures = 0;
+    try {
+        ReportHost host(parser.value(u"database"_s));
+        QStringList paths = parser.positionalArguments().mid(1);
+        if (paths.isEmpty()) {
+            const QDir folder(parser.value(u"reports"_s));
+            for (const QString& name : folder.entryList({ u"*.rpt"_s }, QDir::Files, QDir::Name))
+                paths << folder.filePath(name);
+        }
+        if (paths.isEmpty()) {
+            printError(u"no reports to export"_s);
+            return 2;
+        }
+        for (qsizetype i = 0; i < paths.size(); ++i) {
+            const QString& path = paths[i];
+            const QString target = QFileInfo(
+                QDir(output).filePath(QFileInfo(path).completeBaseName() + known->extension))
+                                       .absoluteFilePath();
+            ReportHost::progress(u"[%1/%2] %3: reading and writing..."_s.arg(i + 1)
+                                     .arg(paths.size())
+                                     .arg(QFileInfo(path).fileName()));
+            QElapsedTimer timer;
+            timer.start();
+            try {
+                const auto report = host.open(path, parser);
+                exportReport(*report, format, target);
+                const auto status = report->Status();
+                // Status tells the page count only once every record was printed; the
+                // runtime's own count is final after an export.
+                const auto runtimeReport = report->GetReport();
+                const int32_t pages = runtimeReport ? runtimeReport->printingStatus().pageCount : 0;
+                ReportHost::progress(QString());
+                std::fputs(qPrintable(u"%1: %2 records, %3 pages, %4 ms\n"_s
+                                          .arg(QDir::toNativeSeparators(target))
+                                          .arg(status ? status->NumberOfRecordPrinted : 0)
+                                          .arg(pages)
+                                          .arg(timer.elapsed())),
+                    stdout);
+                std::fflush(stdout);
+                report->CloseReport();
+            } catch (const core::ComError& error) {
+                ReportHost::progress(QString());
+                printError(u"%1: %2"_s.arg(path, host.explain(error)));
+                ++failures;
+            }
+        }
+    } catch (const core::ComError& error) {
+        printError(error.description());
+        return 2;
+    }
+    return failures == 0 ? 0 : 1;
+}
