@@ -1,5 +1,6 @@
-#include "outputlogging_p.h"
 #include "reportrt/base/durablefile_p.h"
+
+#include "reportrt/base/logging_p.h"
 
 #include <QFileInfo>
 #include <cerrno>
