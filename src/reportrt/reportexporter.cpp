@@ -3,6 +3,8 @@
 #include "exportoptions.h"
 #include "pdfexporter.h"
 #include "report.h"
+#include "reportrt/output/htmlexporter.h"
+#include "reportrt/output/xlsxexporter.h"
 #include "runtimeerror.h"
 
 namespace reportrt {
@@ -26,13 +28,9 @@ void ReportExporter::exportReport(Report& report, const ExportOptions& options, 
                            "destination and file name, and export without prompting."));
     switch (options.formatType()) {
     case formatPdf:
-        break;
     case formatExcel:
-        raiseError(Error::RuntimeFailure,
-            QStringLiteral("Exporting to Excel (format 38) is not supported yet."));
     case formatHtml:
-        raiseError(Error::RuntimeFailure,
-            QStringLiteral("Exporting to HTML (format 32) is not supported yet."));
+        break;
     default:
         raiseError(Error::RuntimeFailure,
             QStringLiteral("%1 is not an export format (31 PDF, 38 Excel, 32 HTML).")
@@ -56,7 +54,19 @@ void ReportExporter::exportReport(Report& report, const ExportOptions& options, 
     // The no-data event cancelled the report: there is nothing to export.
     if (status.progress == progressCancelled)
         return;
-    status.pageCount = PdfExporter::exportTo(report, options.diskFileName());
+    switch (options.formatType()) {
+    case formatExcel:
+        status.pageCount = XlsxExporter::exportTo(report, options, options.diskFileName());
+        break;
+    case formatHtml:
+        // The disk file name is where this export goes (a scratch file first, then the
+        // caller's); the HTML file name only stands in when none was set.
+        status.pageCount = HtmlExporter::exportTo(report, options,
+            options.diskFileName().isEmpty() ? options.htmlFileName() : options.diskFileName());
+        break;
+    default:
+        status.pageCount = PdfExporter::exportTo(report, options.diskFileName());
+    }
     status.progress = progressCompleted;
     report.setPrintingStatus(status);
 }
