@@ -15,6 +15,7 @@
 #include <QLocale>
 #include <QRegularExpression>
 #include <algorithm>
+#include <array>
 #include <cmath>
 #include <cstdlib>
 #include <unordered_map>
@@ -348,39 +349,77 @@ private:
             m_sheet, row, static_cast<lxw_col_t>(column), text.toUtf8().constData(), f));
     }
 
-    /// The Excel format and cell number of a numeric or calendar value; false for others.
-    bool numberOf(const Value& value, const QString& pattern, QString* numberFormat, double* number)
+    enum Shape { WholeNumber, Fraction, Currency, Date, DateTime, Time, shapes };
+
+    /// The cell format of a value shape with a report pattern, made once per pattern:
+    /// this runs for every numeric cell.
+    lxw_format* shapeFormat(const QString& pattern, Shape shape, bool bold)
     {
+        auto& formats = m_shapeFormats[pattern];
+        lxw_format*& cached = formats[static_cast<size_t>(shape * 2 + (bold ? 1 : 0))];
+        if (cached)
+            return cached;
+        QString f;
+        switch (shape) {
+        case WholeNumber:
+        case Fraction:
+        case Currency:
+            f = excelNumberFormat(pattern);
+            if (f.isEmpty())
+                f = shape == WholeNumber ? QStringLiteral("#,##0") : QStringLiteral("#,##0.00");
+            break;
+        case Date:
+            f = pattern.isEmpty() ? m_defaultDate : excelDateFormat(pattern);
+            break;
+        case DateTime:
+            f = pattern.isEmpty() ? m_defaultDate + QStringLiteral(" hh:mm:ss")
+                                  : excelDateFormat(pattern);
+            break;
+        case Time:
+        case shapes:
+            f = pattern.isEmpty() ? QStringLiteral("hh:mm:ss") : excelDateFormat(pattern);
+            break;
+        }
+        cached = format(f, bold);
+        return cached;
+    }
+
+    /// The cell format and number of a numeric or calendar value; false for others.
+    bool numberOf(const Value& value, const QString& pattern, bool bold, lxw_format** cellFormat,
+        double* number)
+    {
+        Shape shape = Fraction;
         switch (value.type()) {
         case ValueType::Number:
-        case ValueType::Currency: {
             *number = value.numeric();
-            QString f = excelNumberFormat(pattern);
-            if (f.isEmpty())
-                f = value.type() == ValueType::Number && *number == std::floor(*number)
-                    ? QStringLiteral("#,##0")
-                    : QStringLiteral("#,##0.00");
-            *numberFormat = f;
-            return true;
-        }
+            shape = *number == std::floor(*number) ? WholeNumber : Fraction;
+            break;
+        case ValueType::Currency:
+            *number = value.numeric();
+            shape = Currency;
+            break;
         case ValueType::Date:
             *number = static_cast<double>(value.julianDay() - excelEpochJulianDay);
-            *numberFormat = pattern.isEmpty() ? defaultDateFormat() : excelDateFormat(pattern);
-            return *number >= firstSafeSerial;
+            if (*number < firstSafeSerial)
+                return false;
+            shape = Date;
+            break;
         case ValueType::DateTime:
             *number = static_cast<double>(value.dateTimeMsecs()) / Value::msecsPerDay
                 - static_cast<double>(excelEpochJulianDay);
-            *numberFormat = pattern.isEmpty() ? defaultDateFormat() + QStringLiteral(" hh:mm:ss")
-                                              : excelDateFormat(pattern);
-            return *number >= firstSafeSerial;
+            if (*number < firstSafeSerial)
+                return false;
+            shape = DateTime;
+            break;
         case ValueType::Time:
             *number = static_cast<double>(value.msecsOfDay()) / Value::msecsPerDay;
-            *numberFormat
-                = pattern.isEmpty() ? QStringLiteral("hh:mm:ss") : excelDateFormat(pattern);
-            return true;
+            shape = Time;
+            break;
         default:
             return false;
         }
+        *cellFormat = shapeFormat(pattern, shape, bold);
+        return true;
     }
 
     void writeValue(lxw_row_t row, int column, const ReportObject& object, bool bold)
@@ -388,10 +427,10 @@ private:
         const Value value = m_walker.value(object);
         const ObjectDefinition& def = object.current();
         const auto col = static_cast<lxw_col_t>(column);
-        QString numberFormat;
+        lxw_format* cellFormat = nullptr;
         double number = 0;
-        if (numberOf(value, def.format, &numberFormat, &number)) {
-            check(worksheet_write_number(m_sheet, row, col, number, format(numberFormat, bold)));
+        if (numberOf(value, def.format, bold, &cellFormat, &number)) {
+            check(worksheet_write_number(m_sheet, row, col, number, cellFormat));
             return;
         }
         switch (value.type()) {
@@ -505,9 +544,9 @@ private:
             first = static_cast<lxw_row_t>(m_firstDetailRow);
         }
         const Value value = m_walker.value(object);
-        QString numberFormat;
+        lxw_format* cellFormat = nullptr;
         double number = 0;
-        if (!numberOf(value, def.format, &numberFormat, &number))
+        if (!numberOf(value, def.format, true, &cellFormat, &number))
             return false;
         const QString name = columnName(column);
         const QString formula = QStringLiteral("=SUBTOTAL(%1,%2%3:%2%4)")
@@ -516,7 +555,7 @@ private:
                                     .arg(first + 1)
                                     .arg(m_lastDetailRow + 1);
         check(worksheet_write_formula_num(m_sheet, m_row, static_cast<lxw_col_t>(column),
-            formula.toLatin1().constData(), format(numberFormat, true), number));
+            formula.toLatin1().constData(), cellFormat, number));
         return true;
     }
 
@@ -530,6 +569,8 @@ private:
     std::vector<Column> m_columns;
     std::unordered_map<const Section*, RowTemplate> m_templates;
     QHash<QString, lxw_format*> m_formats;
+    QHash<QString, std::array<lxw_format*, shapes * 2>> m_shapeFormats;
+    QString m_defaultDate = defaultDateFormat();
     std::unordered_map<int, lxw_row_t> m_groupFirstRow; // by group level
     std::vector<lxw_row_t> m_breaks;
     lxw_row_t m_row = 0;
