@@ -425,6 +425,32 @@ TEST_F(Writers, HtmlSeparatePagesAreLinkedAndRenderInABrowser)
     EXPECT_TRUE(renderedDom(dir.filePath(u"out/sales.htm"_s)).contains(u"&lt;script&gt;"_s));
 }
 
+class ExampleReports : public testing::TestWithParam<const char*> { };
+
+TEST_P(ExampleReports, BreakPagesWhereThePrintedLayoutDoes)
+{
+    // Reports without can-grow text or subreports: the writers' pages must be the
+    // printed ones, or page numbers and page breaks in the exports would lie.
+    auto report = openExample(QString::fromLatin1(GetParam()));
+    const int printed = static_cast<int>(layOut(*report).size());
+    QTemporaryDir dir;
+    const QString path = dir.filePath(u"report.html"_s);
+    exportAs(*report, 32, path);
+    EXPECT_EQ(report->printingStatus().pageCount, printed);
+    EXPECT_TRUE(QFile::exists(HtmlExporter::pageFileName(path, printed)));
+    EXPECT_FALSE(QFile::exists(HtmlExporter::pageFileName(path, printed + 1)));
+    const QJsonObject last = check(u"html"_s, HtmlExporter::pageFileName(path, printed));
+    const QString lastText = QString::fromUtf8(QJsonDocument(last[u"tables"_s].toArray()).toJson());
+    EXPECT_TRUE(lastText.contains(u"Page %1 of %1"_s.arg(printed))) << lastText.toStdString();
+
+    exportAs(*report, 38, dir.filePath(u"report.xlsx"_s));
+    EXPECT_EQ(report->printingStatus().pageCount, printed);
+    EXPECT_FALSE(check(u"xlsx"_s, dir.filePath(u"report.xlsx"_s))[u"rows"_s].toArray().isEmpty());
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Writers, ExampleReports, testing::Values("orders-by-customer.rpt", "sales-by-country.rpt"));
+
 TEST(HtmlPageFiles, AreNumberedBeforeTheExtension)
 {
     const struct {
