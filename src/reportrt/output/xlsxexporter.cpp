@@ -6,10 +6,8 @@
 #include "reportrt/report.h"
 #include "reportrt/reportobject.h"
 #include "reportrt/section.h"
-#include "reportrt/valueformatter.h"
 #include "stagedfile.h"
 
-#include <QDate>
 #include <QFile>
 #include <QHash>
 #include <QLocale>
