@@ -1,7 +1,8 @@
-// Times reading the records and exporting to PDF of a grouped list with eight columns
-// over a generated database of the given number of orders, and the peak memory of that.
+// Times reading the records and exporting to PDF, Excel or HTML of a grouped list with
+// eight columns over a generated database of the given number of orders, and the peak
+// memory of that.
 //
-//   export_bench [--rows N]... [--keep FOLDER [--reuse]]
+//   export_bench [--rows N]... [--format pdf|xlsx|html]... [--keep FOLDER [--reuse]]
 
 #include "core/comerror.h"
 #include "core/variant.h"
@@ -147,7 +148,28 @@ int main(int argc, char* argv[])
         QStringLiteral("Reuse databases kept in the --keep folder by an earlier run.") });
     parser.addOption({ QStringLiteral("report"), QStringLiteral("The report to export."),
         QStringLiteral("file"), QStringLiteral(LUDMOX_BENCH_REPORT) });
+    parser.addOption({ QStringLiteral("format"),
+        QStringLiteral("pdf, xlsx or html; all three when not given."), QStringLiteral("name") });
     parser.process(application);
+    struct Format {
+        QString name;
+        int code;
+    };
+    std::vector<Format> formats;
+    QStringList names = parser.values(QStringLiteral("format"));
+    if (names.isEmpty())
+        names
+            = QStringList { QStringLiteral("pdf"), QStringLiteral("xlsx"), QStringLiteral("html") };
+    for (const QString& name : names) {
+        if (name == u"pdf")
+            formats.push_back({ name, 31 });
+        else if (name == u"xlsx")
+            formats.push_back({ name, 38 });
+        else if (name == u"html")
+            formats.push_back({ name, 32 });
+        else
+            fail(QStringLiteral("--format takes pdf, xlsx or html, not %1").arg(name));
+    }
     QStringList counts = parser.values(QStringLiteral("rows"));
     if (counts.isEmpty())
         counts << QStringLiteral("100000");
@@ -157,48 +179,61 @@ int main(int argc, char* argv[])
         ? parser.value(QStringLiteral("keep"))
         : scratch.path();
     QDir().mkpath(folder);
-    std::printf("%10s %8s %9s %9s %9s %8s %9s %9s %8s\n", "rows", "pages", "read s", "export s",
-        "rows/s", "pages/s", "cpu s", "cpu rows/s", "peak MiB");
+    std::printf("%6s %10s %8s %9s %9s %9s %8s %9s %9s %8s\n", "format", "rows", "pages", "read s",
+        "export s", "rows/s", "pages/s", "cpu s", "cpu rows/s", "peak MiB");
     for (const QString& count : counts) {
         bool ok = false;
         const int rows = count.toInt(&ok);
         if (!ok || rows < 1)
             fail(QStringLiteral("--rows takes a positive number, not %1").arg(count));
         const QString database = QDir(folder).filePath(QStringLiteral("bench-%1.db").arg(rows));
-        const QString pdf = QDir(folder).filePath(QStringLiteral("bench-%1.pdf").arg(rows));
         if (!parser.isSet(QStringLiteral("reuse")) || !QFile::exists(database)) {
             QFile::remove(database);
             makeDatabase(database, rows);
         }
-
-        resetPeak();
-        const double cpuStart = cpuSeconds();
-        QElapsedTimer timer;
-        timer.start();
-        try {
-            auto report = reportrt::Report::open(parser.value(QStringLiteral("report")));
-            relocate(*report, database);
-            report->readRecords();
-            const double read = static_cast<double>(timer.nsecsElapsed()) / 1e9;
-            const auto options = report->exportOptions();
-            options->setFormatType(31);
-            options->setDestinationType(1);
-            options->setDiskFileName(pdf);
-            report->exportReport(false);
-            const double total = static_cast<double>(timer.nsecsElapsed()) / 1e9;
-            const double cpu = cpuSeconds() - cpuStart;
-            const auto status = report->printingStatus();
-            std::printf("%10d %8d %9.2f %9.2f %9.0f %8.0f %9.2f %9.0f %8.1f\n",
-                status.recordsPrinted, status.pageCount, read, total - read, rows / total,
-                status.pageCount / total, cpu, rows / cpu, peakMiB());
-            std::fflush(stdout);
-        } catch (const core::ComError& error) {
-            fail(error.description());
+        for (const Format& format : formats) {
+            const QString output
+                = QDir(folder).filePath(QStringLiteral("bench-%1.%2").arg(rows).arg(format.name));
+            resetPeak();
+            const double cpuStart = cpuSeconds();
+            QElapsedTimer timer;
+            timer.start();
+            try {
+                auto report = reportrt::Report::open(parser.value(QStringLiteral("report")));
+                relocate(*report, database);
+                report->readRecords();
+                const double read = static_cast<double>(timer.nsecsElapsed()) / 1e9;
+                const auto options = report->exportOptions();
+                options->setFormatType(format.code);
+                options->setDestinationType(1);
+                options->setDiskFileName(output);
+                if (format.code == 38) {
+                    // As the component sets them.
+                    options->setExcelAreaType(4);
+                    options->setExcelConstantColumnWidth(true);
+                    options->setExcelTabHasColumnHeadings(true);
+                    options->setExcelUseWorksheetFunctions(false);
+                    options->setExcelPageBreaks(true);
+                    options->setExcelExportAllPages(true);
+                }
+                options->setHtmlSeparatePages(false);
+                report->exportReport(false);
+                const double total = static_cast<double>(timer.nsecsElapsed()) / 1e9;
+                const double cpu = cpuSeconds() - cpuStart;
+                const auto status = report->printingStatus();
+                std::printf("%6s %10d %8d %9.2f %9.2f %9.0f %8.0f %9.2f %9.0f %8.1f\n",
+                    qPrintable(format.name), status.recordsPrinted, status.pageCount, read,
+                    total - read, rows / total, status.pageCount / total, cpu, rows / cpu,
+                    peakMiB());
+                std::fflush(stdout);
+            } catch (const core::ComError& error) {
+                fail(error.description());
+            }
+            if (!parser.isSet(QStringLiteral("keep")))
+                QFile::remove(output);
         }
-        if (!parser.isSet(QStringLiteral("keep"))) {
+        if (!parser.isSet(QStringLiteral("keep")))
             QFile::remove(database);
-            QFile::remove(pdf);
-        }
     }
     return 0;
 }

@@ -167,7 +167,7 @@ TEST_P(ExportFailures, AreClearAndLeaveNothingBehind)
     }
     EXPECT_EQ(
         QDir(dir.path()).entryList(QDir::AllEntries | QDir::Hidden | QDir::NoDotAndDotDot), before);
-    // The options stay as they were set, for the writers still to come.
+    // A failed export leaves the options as they were set.
     EXPECT_EQ(options->formatType(), c.format);
     EXPECT_EQ(options->excelAreaType(), 4);
     EXPECT_TRUE(options->htmlNavigator());
@@ -179,8 +179,11 @@ INSTANTIATE_TEST_SUITE_P(Pdf, ExportFailures,
         FailureCase {
             "MissingFolder", u"missing/out.pdf"_s, 31, 1, Error::ExportFailed, "does not exist" },
         FailureCase { "TargetIsAFolder", u"folder"_s, 31, 1, Error::ExportFailed, "is a folder" },
-        FailureCase { "Excel", u"out.xls"_s, 38, 1, Error::RuntimeFailure, "not supported yet" },
-        FailureCase { "Html", u"out.htm"_s, 32, 0, Error::RuntimeFailure, "not supported yet" },
+        FailureCase { "ExcelMissingFolder", u"missing/out.xls"_s, 38, 1, Error::ExportFailed,
+            "does not exist" },
+        FailureCase { "ExcelNoFileName", u""_s, 38, 1, Error::ExportFailed, "no file name" },
+        FailureCase {
+            "HtmlTargetIsAFolder", u"folder"_s, 32, 0, Error::ExportFailed, "is a folder" },
         FailureCase {
             "UnknownFormat", u"out.pdf"_s, 99, 1, Error::RuntimeFailure, "not an export format" },
         FailureCase { "UnknownDestination", u"out.pdf"_s, 31, 7, Error::RuntimeFailure,

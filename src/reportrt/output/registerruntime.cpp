@@ -2,10 +2,12 @@
 
 #include "reportrt/application.h"
 #include "reportrt/base/reportoutput.h"
+#include "reportrt/output/htmlexporter.h"
 #include "reportrt/output/pdfexporter.h"
 #include "reportrt/output/reportexporter.h"
 #include "reportrt/output/reportprinter.h"
 #include "reportrt/output/writertable.h"
+#include "reportrt/output/xlsxexporter.h"
 #include "runtime/applicationfactory.h"
 
 namespace reportrt {
@@ -36,6 +38,17 @@ void registerRuntime()
     WriterTable::add(
         runtime::ExportFormat::PDF, [](Report& report, const ExportOptions&, const QString& path) {
             return PdfExporter::exportTo(report, path);
+        });
+    WriterTable::add(runtime::ExportFormat::Excel,
+        [](Report& report, const ExportOptions& options, const QString& path) {
+            return XlsxExporter::exportTo(report, options, path);
+        });
+    // The disk file name is where an export goes (a scratch file first, then the caller's);
+    // the HTML file name only stands in when none was set.
+    WriterTable::add(runtime::ExportFormat::HTML,
+        [](Report& report, const ExportOptions& options, const QString& path) {
+            return HtmlExporter::exportTo(
+                report, options, path.isEmpty() ? options.htmlFileName() : path);
         });
     ReportOutput::install(std::make_unique<RuntimeOutput>());
     runtime::ApplicationFactory::install([]() -> std::shared_ptr<runtime::Application> {

@@ -29,12 +29,25 @@ QString formatName(int32_t code)
     return {};
 }
 
+QString extensionOf(int32_t formatCode)
+{
+    switch (static_cast<runtime::ExportFormat>(formatCode)) {
+    case runtime::ExportFormat::Excel:
+        return QStringLiteral("xlsx");
+    case runtime::ExportFormat::HTML:
+        return QStringLiteral("html");
+    case runtime::ExportFormat::PDF:
+        break;
+    }
+    return QStringLiteral("pdf");
+}
+
 // Exports into a private temporary file, mails it under the report's own name and removes
 // the file on every path. Returns the page count.
 int mailReport(Report& report, const ExportOptions& options, const WriterTable::Writer& writer)
 {
-    QTemporaryFile attachment(
-        platform::TempFolder::systemPath() + QStringLiteral("mail-XXXXXX.pdf"));
+    const QString extension = extensionOf(options.formatType());
+    QTemporaryFile attachment(platform::TempFolder::systemPath() + u"mail-XXXXXX." + extension);
     if (!attachment.open())
         raiseError(Error::ExportFailed,
             QStringLiteral("The mail attachment could not be written in the temporary folder: %1.")
@@ -51,7 +64,7 @@ int mailReport(Report& report, const ExportOptions& options, const WriterTable::
     request.attachmentPath = attachment.fileName();
     const QString baseName = QFileInfo(report.fileName()).completeBaseName();
     request.attachmentName
-        = (baseName.isEmpty() ? QStringLiteral("report") : baseName) + QStringLiteral(".pdf");
+        = (baseName.isEmpty() ? QStringLiteral("report") : baseName) + u'.' + extension;
     try {
         mail::MailDelivery::send(request);
     } catch (const mail::MailError& error) {
