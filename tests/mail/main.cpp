@@ -1,3 +1,5 @@
+#include "reportrt/output/registerruntime.h"
+
 #include <QGuiApplication>
 #include <QStandardPaths>
 #include <gtest/gtest.h>
@@ -8,6 +10,7 @@ int main(int argc, char** argv)
     // must not touch the user's real folders.
     QGuiApplication app(argc, argv);
     QStandardPaths::setTestModeEnabled(true);
+    reportrt::registerRuntime();
     ::testing::InitGoogleTest(&argc, argv);
     return RUN_ALL_TESTS();
 }

@@ -2,6 +2,7 @@
 
 #include "reportrt/application.h"
 #include "reportrt/base/reportoutput.h"
+#include "reportrt/exportoptions.h"
 #include "reportrt/output/htmlexporter.h"
 #include "reportrt/output/pdfexporter.h"
 #include "reportrt/output/reportexporter.h"
