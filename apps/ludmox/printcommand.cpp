@@ -138,9 +138,12 @@ int printReport(const QCommandLineParser& parser)
                                                              : moxEngine->LastError()),
                 1);
         } else {
+            // The status knows the page count only when every record read was printed.
             const auto status = report->Status();
-            say(u"%1: printed on %2, %3 pages"_s.arg(reportFile, printer)
-                    .arg(status ? status->NumberOfPages : -1));
+            say(status && status->NumberOfPages >= 0
+                    ? u"%1: printed on %2, %3 pages"_s.arg(reportFile, printer)
+                          .arg(status->NumberOfPages)
+                    : u"%1: printed on %2"_s.arg(reportFile, printer));
         }
         report->CloseReport();
     } catch (const core::ComError& error) {
