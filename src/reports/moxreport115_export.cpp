@@ -7,7 +7,10 @@
 #include "reports/moxreport115_p.h"
 #include "reports/reportslogging_p.h"
 #include "reports/stagedtarget.h"
+#include "runtime/exportdestination.h"
+#include "runtime/exportformat.h"
 #include "runtime/exportoptions.h"
+#include "runtime/printingprogress.h"
 #include "runtime/report.h"
 
 #include <QDateTime>
@@ -20,11 +23,11 @@ namespace reports {
 
 namespace {
 
-constexpr int32_t formatPdf = 31;
-constexpr int32_t formatExcel = 38;
-constexpr int32_t formatHtml = 32;
-constexpr int32_t destinationDisk = 1;
-constexpr int16_t progressCompleted = 3;
+constexpr auto formatPdf = static_cast<int32_t>(runtime::ExportFormat::PDF);
+constexpr auto formatExcel = static_cast<int32_t>(runtime::ExportFormat::Excel);
+constexpr auto formatHtml = static_cast<int32_t>(runtime::ExportFormat::HTML);
+constexpr auto destinationDisk = static_cast<int32_t>(runtime::ExportDestination::DiskFile);
+constexpr auto progressCompleted = static_cast<int16_t>(runtime::PrintingProgress::Completed);
 
 /// Excel options in the order the runtime takes them: area type, constant column width,
 /// column headings, worksheet functions, page breaks, all pages.

@@ -7,6 +7,7 @@
 #include "reports/moxreport115_p.h"
 #include "reports/reportslogging_p.h"
 #include "runtime/application.h"
+#include "runtime/exportdestination.h"
 #include "runtime/exportoptions.h"
 #include "runtime/report.h"
 
@@ -19,8 +20,8 @@ namespace reports {
 
 namespace {
 
-constexpr int32_t destinationDisk = 1;
-constexpr int32_t destinationMail = 2;
+constexpr auto destinationDisk = static_cast<int32_t>(runtime::ExportDestination::DiskFile);
+constexpr auto destinationMail = static_cast<int32_t>(runtime::ExportDestination::Mail);
 /// Open option of the temporary copy: exclusive use by this process.
 constexpr int16_t openExclusive = 1;
 /// The report's own file is opened again with the runtime's default option.
