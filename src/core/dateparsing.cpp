@@ -1,6 +1,5 @@
-#include "core/dateparsing_p.h"
-
 #include "core/dateformatting_p.h"
+#include "core/dateparsing_p.h"
 
 #include <QStringView>
 #include <algorithm>

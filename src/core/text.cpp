@@ -1,9 +1,9 @@
 #include "core/text.h"
 
+#include "core/comerror.h"
 #include "core/dateformatting_p.h"
 #include "core/dateparsing_p.h"
 #include "core/numbertext_p.h"
-#include "core/comerror.h"
 
 #include <QLocale>
 #include <utility>

@@ -1,5 +1,4 @@
 #include "reportrt/base/durablefile_p.h"
-
 #include "reportrt/base/logging_p.h"
 
 #include <QFileInfo>
