@@ -1,25 +1,17 @@
 #include "reportrt/report.h"
 
-#include "reportrt/base/invarianttext.h"
 #include "reportrt/base/reportoutput.h"
 #include "reportrt/base/runtimeerror.h"
-#include "reportrt/data/providermap.h"
-#include "reportrt/data/recordreader.h"
-#include "reportrt/data/sqlconnection.h"
-#include "reportrt/data/sqlstatement.h"
-#include "reportrt/data/sqltranslator.h"
+#include "reportrt/data/queryplanner.h"
 #include "reportrt/databasetable.h"
-#include "reportrt/document/documentenvironment.h"
 #include "reportrt/document/documentreader.h"
 #include "reportrt/document/documentwriter.h"
 #include "reportrt/exportoptions.h"
-#include "reportrt/formula/formulacompiler.h"
 #include "reportrt/formula/formulaevaluator.h"
 #include "reportrt/parameterfield.h"
 #include "reportrt/reportobject.h"
 #include "reportrt/section.h"
 
-#include <QCryptographicHash>
 #include <QRegularExpression>
 
 namespace reportrt {
@@ -28,28 +20,6 @@ namespace {
 [[noreturn]] void formulaError(const FormulaException& error)
 {
     raiseError(Error::FormulaError, error.error().describe());
-}
-
-SqlDialect dialectOf(const std::vector<ConnectionProperty>& properties)
-{
-    try {
-        return ProviderMap::fromProperties(properties).dialect;
-    } catch (const core::ComError&) {
-        // Before a table is relocated its provider may not be reachable; the text is
-        // still written, for the provider it names.
-        for (const auto& p : properties) {
-            if (p.name.compare(u"Provider", Qt::CaseInsensitive) == 0
-                && p.text.startsWith(u"SQLOLEDB", Qt::CaseInsensitive))
-                return ProviderMap::serverDriver() == u"QPSQL" ? SqlDialect::PostgreSQL
-                                                               : SqlDialect::Generic;
-        }
-        return SqlDialect::SQLite;
-    }
-}
-
-QString reference(const TableDefinition& table, const FieldDefinition& field)
-{
-    return u'{' + table.name + u'.' + field.name + u'}';
 }
 
 int groupLevel(const QString& areaName, size_t groupCount)
@@ -63,30 +33,6 @@ int groupLevel(const QString& areaName, size_t groupCount)
     return level <= static_cast<int>(groupCount) ? level : -1;
 }
 } // namespace
-
-struct Report::Plan {
-    std::vector<TableDefinition> tables;
-    std::vector<ParameterDefinition> parameters;
-    std::vector<FormulaDefinition> formulas;
-    std::unique_ptr<DocumentEnvironment> environment;
-    std::unique_ptr<FormulaCompiler> compiler;
-    std::unique_ptr<FormulaCompiler> checker;
-    std::shared_ptr<const FormulaExpr> selection;
-    std::vector<const FormulaExpr*> conditions; // evaluated on each record
-    std::vector<RecordProcessor::Group> groups;
-    std::vector<RecordProcessor::Sort> sorts;
-    std::vector<RecordProcessor::Summary> summaries;
-    std::map<QString, std::shared_ptr<const FormulaExpr>> references; // lower-case text
-    std::map<const ReportObject*, int> summaryOfObject;
-    std::vector<RecordReader::Column> columns;
-    std::vector<QString> columnReferences;
-    QString sql; // the statement as the report shows and saves it
-    QString runSql; // what runs: sql, or with this run's parameter conditions added
-    bool matchByName = false;
-    bool isProcedure = false;
-    SqlDialect dialect = SqlDialect::SQLite;
-    QString signature;
-};
 
 std::shared_ptr<Report> Report::open(const QString& path)
 {
@@ -102,11 +48,7 @@ std::shared_ptr<Report> Report::fromDocument(
     return report;
 }
 
-Report::~Report()
-{
-    // Queries are gone; the connections close and leave the process's connection list.
-    m_connections.clear();
-}
+Report::~Report() = default;
 
 std::shared_ptr<Report> Report::self() const
 {
@@ -136,7 +78,7 @@ void Report::build(const ReportDocument& document, const QString& fileName)
     m_document.parameters.clear();
     m_document.sections.clear();
     if (document.savedData) {
-        Saved saved { RecordSet(static_cast<int>(document.savedData->columns.size())),
+        RecordCache::Saved saved { RecordSet(static_cast<int>(document.savedData->columns.size())),
             document.savedData->columns, document.savedData->recordsRead,
             document.savedData->signature };
         saved.records.reserve(static_cast<qsizetype>(document.savedData->rows.size()));
@@ -145,7 +87,7 @@ void Report::build(const ReportDocument& document, const QString& fileName)
             for (size_t i = 0; i < row.size(); ++i)
                 record[i] = row[i];
         }
-        m_saved = std::move(saved);
+        m_cache.keep(std::move(saved));
     }
     m_document.savedData.reset();
 }
@@ -214,7 +156,7 @@ void Report::setTopNGroupCount(const QString& areaName, int32_t count)
 
 void Report::discardSavedData()
 {
-    m_saved.reset();
+    m_cache.forget();
     m_result.reset();
     m_lastPlan.reset();
     m_currentRecord = -1;
@@ -245,256 +187,19 @@ bool Report::usesParameter(const QString& name) const
     return false;
 }
 
-std::shared_ptr<Report::Plan> Report::plan(bool bindParameters) const
+std::shared_ptr<QueryPlan> Report::plan(bool bindParameters) const
 {
-    auto p = std::make_shared<Plan>();
+    QueryPlanner::Input input;
     for (const auto& t : m_tables)
-        p->tables.push_back(t->definition());
+        input.tables.push_back(t->definition());
     for (const auto& parameter : m_parameters)
-        p->parameters.push_back(parameter->definition());
-    p->formulas = m_document.formulas;
-    p->environment = std::make_unique<DocumentEnvironment>(p->tables, p->parameters, p->formulas);
-    p->compiler = std::make_unique<FormulaCompiler>(*p->environment,
-        bindParameters ? FormulaCompiler::Mode::Bind : FormulaCompiler::Mode::Check);
-    p->checker = std::make_unique<FormulaCompiler>(*p->environment, FormulaCompiler::Mode::Check);
-
-    const auto compileReference = [&](FormulaCompiler& compiler, const QString& text) {
-        try {
-            auto compiled = compiler.compile(text, text);
-            if (!compiled)
-                raiseError(Error::FormulaError, QStringLiteral("\"%1\" is not a field").arg(text));
-            return compiled;
-        } catch (const FormulaException& error) {
-            formulaError(error);
-        }
-    };
-
-    // What objects show is bound to the parameters' values where they have them; a
-    // parameter without one must not stop the read, it shows nothing.
-    const auto compileShown = [&](const QString& text) {
-        if (bindParameters) {
-            try {
-                return compileReference(*p->compiler, text);
-            } catch (const core::ComError&) { }
-        }
-        return compileReference(*p->checker, text);
-    };
-
-    try {
-        p->selection
-            = p->compiler->compile(m_document.selectionFormula, QStringLiteral("Record Selection"));
-    } catch (const FormulaException& error) {
-        formulaError(error);
-    }
-    if (p->selection && (p->selection->type != ValueType::Boolean || p->selection->isArray))
-        raiseError(Error::FormulaError,
-            QStringLiteral("Error in formula Record Selection: the formula gives %1, not a Boolean")
-                .arg(valueTypeName(p->selection->type)));
-
-    for (size_t i = 0; i < m_document.groups.size(); ++i) {
-        const GroupDefinition& g = m_document.groups[i];
-        RecordProcessor::Group group { compileReference(*p->compiler, g.field), g.order,
-            g.topNCount, -1 };
-        if (g.topNCount > 0) {
-            group.topNSummary = static_cast<int>(p->summaries.size());
-            p->summaries.push_back({ g.topNSummary.operation,
-                compileReference(*p->compiler, g.topNSummary.field), static_cast<int>(i) + 1 });
-        }
-        p->groups.push_back(group);
-    }
-    for (const SortDefinition& s : m_document.sorts)
-        p->sorts.push_back({ compileReference(*p->compiler, s.field), s.order });
+        input.parameters.push_back(parameter->definition());
+    input.document = &m_document;
     for (const auto& section : m_sections) {
-        for (const auto& object : section->objects()) {
-            const ObjectDefinition o = object->definition();
-            if (o.kind == ObjectDefinition::Kind::Summary) {
-                p->summaryOfObject[object.get()] = static_cast<int>(p->summaries.size());
-                p->summaries.push_back(
-                    { o.operation, compileReference(*p->compiler, o.field), o.group });
-            }
-            if (o.kind == ObjectDefinition::Kind::Field || o.kind == ObjectDefinition::Kind::Blob)
-                p->references[o.field.toLower()] = compileShown(o.field);
-            for (const SubreportLink& link : o.links)
-                p->references[link.mainField.toLower()]
-                    = compileReference(*p->checker, link.mainField);
-        }
+        for (const auto& object : section->objects())
+            input.objects.emplace_back(object.get(), object->definition());
     }
-
-    const TableDefinition* first = p->tables.empty() ? nullptr : &p->tables.front();
-    p->dialect = first ? dialectOf(first->connection) : SqlDialect::SQLite;
-    for (const RecordColumn& c : p->environment->columns()) {
-        const TableDefinition& table = p->tables[static_cast<size_t>(c.table)];
-        const FieldDefinition& field = table.fields[static_cast<size_t>(c.field)];
-        p->columns.push_back({ table.name + u'.' + field.name, field.type });
-        p->columnReferences.push_back(reference(table, field));
-    }
-
-    // Conditions SQL can evaluate go first, to the database or, when the statement is
-    // set, to the records before the rest; so a record a translated condition rejects
-    // never meets the others, with the database filtering or without.
-    const SqlTranslator translator(p->dialect, [&](const FormulaExpr& field) {
-        const int t = p->environment->tableIndex(field.table);
-        const int f = p->environment->fieldIndex(t, field.name);
-        return SqlStatement::columnName(p->tables[static_cast<size_t>(t)],
-            p->tables[static_cast<size_t>(t)].fields[static_cast<size_t>(f)]);
-    });
-    // The statement text is read back, set again and saved with the report, so a
-    // parameter's value in it would outlive the value's change: conditions with one are
-    // left out of the text. This run's values still narrow the generated statement that
-    // runs; a set statement leaves them to the records, still ahead of the others.
-    std::vector<const FormulaExpr*> translated;
-    std::vector<QString> where;
-    std::vector<const FormulaExpr*> bound;
-    std::vector<QString> boundWhere;
-    std::vector<const FormulaExpr*> rest;
-    for (const FormulaExpr* conjunct : FormulaCompiler::conjuncts(p->selection.get())) {
-        if (auto sql = translator.translate(*conjunct)) {
-            (conjunct->usesParameter ? bound : translated).push_back(conjunct);
-            (conjunct->usesParameter ? boundWhere : where).push_back(*sql);
-        } else {
-            rest.push_back(conjunct);
-        }
-    }
-
-    const bool isCommand = first && first->location.compare(u"Command", Qt::CaseInsensitive) == 0;
-    p->isProcedure = first && !isCommand && first->location.contains(u';');
-    const bool statementSet = !m_document.sqlQuery.isEmpty();
-    if (isCommand || p->isProcedure) {
-        p->matchByName = true;
-        if (isCommand) {
-            p->sql = statementSet ? m_document.sqlQuery : first->command;
-        } else {
-            QStringList arguments;
-            for (const ParameterDefinition& parameter : p->parameters) {
-                if (parameter.kind != 2)
-                    continue;
-                const Value v = parameter.currentValues.empty()
-                    ? parameter.defaultValue.value_or(Value())
-                    : parameter.currentValues.front();
-                arguments << SqlTranslator::literal(p->dialect, v).value_or(QStringLiteral("NULL"));
-            }
-            const QString name
-                = SqlTranslator::qualifiedName(first->location.left(first->location.indexOf(u';')));
-            const QString call = name + u'(' + arguments.join(QStringLiteral(", ")) + u')';
-            p->sql = statementSet
-                ? m_document.sqlQuery
-                : (p->dialect == SqlDialect::PostgreSQL ? QString(u"SELECT * FROM " + call)
-                                                        : QString(u"{CALL " + call + u'}'));
-        }
-        p->conditions = translated;
-        p->conditions.insert(p->conditions.end(), bound.begin(), bound.end());
-        p->conditions.insert(p->conditions.end(), rest.begin(), rest.end());
-    } else {
-        std::vector<SqlStatement::OrderKey> order;
-        const auto addKey = [&](const FormulaExpr& key, SortOrder direction) {
-            const FormulaExpr* e = &key;
-            while (e->kind == FormulaExpr::Kind::Formula && e->body)
-                e = e->body.get();
-            if (e->kind != FormulaExpr::Kind::Field)
-                return false;
-            const int t = p->environment->tableIndex(e->table);
-            const int f = p->environment->fieldIndex(t, e->name);
-            order.push_back({ SqlStatement::columnName(p->tables[static_cast<size_t>(t)],
-                                  p->tables[static_cast<size_t>(t)].fields[static_cast<size_t>(f)]),
-                direction == SortOrder::Descending });
-            return true;
-        };
-        bool ordered = true;
-        for (const auto& g : p->groups)
-            ordered = ordered && addKey(*g.key, g.order);
-        for (const auto& s : p->sorts)
-            ordered = ordered && addKey(*s.key, s.order);
-        if (statementSet) {
-            p->sql = m_document.sqlQuery;
-            p->conditions = translated;
-            p->conditions.insert(p->conditions.end(), bound.begin(), bound.end());
-            p->conditions.insert(p->conditions.end(), rest.begin(), rest.end());
-        } else {
-            p->sql = SqlStatement::select(
-                p->tables, m_document.links, p->environment->columns(), where, order);
-            if (!boundWhere.empty()) {
-                where.insert(where.end(), boundWhere.begin(), boundWhere.end());
-                p->runSql = SqlStatement::select(
-                    p->tables, m_document.links, p->environment->columns(), where, order);
-            }
-            p->conditions = rest;
-        }
-    }
-    if (p->runSql.isEmpty())
-        p->runSql = p->sql;
-
-    // What the records depend on. The password takes no part: the signature is saved.
-    QStringList inputs { p->sql, m_document.selectionFormula };
-    for (const ParameterDefinition& parameter : p->parameters) {
-        QStringList values;
-        for (const Value& v : parameter.currentValues)
-            values << FormulaEvaluator::toText(v, 15) + u'/' + valueTypeName(v.type());
-        inputs << parameter.name + u'=' + values.join(u'|');
-    }
-    if (first) {
-        for (const ConnectionProperty& property : first->connection) {
-            if (property.name.compare(u"Password", Qt::CaseInsensitive) != 0)
-                inputs << property.name + u'=' + property.text + QString::number(property.number)
-                        + (property.boolean ? u'1' : u'0');
-        }
-    }
-    for (const QString& column : p->columnReferences)
-        inputs << column;
-    p->signature = QString::fromLatin1(
-        QCryptographicHash::hash(inputs.join(QChar(0x1F)).toUtf8(), QCryptographicHash::Sha256)
-            .toHex());
-    return p;
-}
-
-SqlConnection& Report::connection(const std::vector<ConnectionProperty>& properties)
-{
-    const ConnectionSpec spec = ProviderMap::fromProperties(properties);
-    const QString key = spec.key();
-    // Connections to other databases are left over from earlier locations.
-    for (auto it = m_connections.begin(); it != m_connections.end();) {
-        if (it->first != key)
-            it = m_connections.erase(it);
-        else
-            ++it;
-    }
-    auto found = m_connections.find(key);
-    if (found != m_connections.end())
-        return *found->second;
-    auto created = std::make_unique<SqlConnection>(spec);
-    QString message;
-    if (!created->open(message))
-        raiseError(Error::TableConnectionFailed,
-            QStringLiteral("Failed to open the connection to the %1. Details: %2")
-                .arg(spec.describe(), message));
-    return *m_connections.emplace(key, std::move(created)).first->second;
-}
-
-void Report::readInto(Plan& p)
-{
-    if (p.tables.empty())
-        raiseError(Error::RuntimeFailure, QStringLiteral("The report has no database tables."));
-    const QString firstKey = ProviderMap::fromProperties(p.tables.front().connection).key();
-    for (const TableDefinition& t : p.tables) {
-        if (ProviderMap::fromProperties(t.connection).key() != firstKey)
-            raiseError(Error::RuntimeFailure,
-                QStringLiteral("The tables %1 and %2 are in different databases; a report reads "
-                               "its tables from one database.")
-                    .arg(p.tables.front().name, t.name));
-    }
-    if (p.isProcedure && p.dialect == SqlDialect::SQLite)
-        raiseError(Error::TableConnectionFailed,
-            QStringLiteral("Failed to open the stored procedure %1: SQLite databases have no "
-                           "stored procedures.")
-                .arg(p.tables.front().location));
-    SqlConnection& c = connection(p.tables.front().connection);
-    RecordReader::Request request;
-    request.database = c.database();
-    request.sql = p.runSql;
-    request.columns = p.columns;
-    request.matchByName = p.matchByName;
-    request.conditions = p.conditions;
-    RecordReader::Result read = RecordReader::read(request);
-    m_saved = Saved { std::move(read.records), p.columnReferences, read.recordsRead, p.signature };
+    return QueryPlanner::plan(input, bindParameters);
 }
 
 void Report::readRecords()
@@ -504,20 +209,18 @@ void Report::readRecords()
     m_result.reset();
     m_currentRecord = -1;
     try {
-        const std::shared_ptr<Plan> p = plan(true);
-        const bool reuse = m_saved && m_saved->signature == p->signature
-            && m_saved->columns == p->columnReferences;
-        if (!reuse)
-            readInto(*p);
+        const std::shared_ptr<QueryPlan> p = plan(true);
+        if (!m_cache.matches(*p))
+            m_cache.read(*p);
         try {
-            m_result
-                = RecordProcessor::process(m_saved->records, p->groups, p->sorts, p->summaries);
+            m_result = RecordProcessor::process(
+                m_cache.saved()->records, p->groups, p->sorts, p->summaries);
         } catch (const FormulaException& error) {
             formulaError(error);
         }
         m_lastPlan = p;
-        m_status.recordsRead = m_saved->recordsRead;
-        m_status.recordsSelected = static_cast<int32_t>(m_saved->records.size());
+        m_status.recordsRead = m_cache.saved()->recordsRead;
+        m_status.recordsSelected = static_cast<int32_t>(m_cache.saved()->records.size());
         m_status.recordsPrinted = static_cast<int32_t>(m_result->records.size());
         m_status.setProgress(runtime::PrintingProgress::Completed);
         if (m_status.recordsSelected == 0 && m_noDataHandler) {
@@ -536,14 +239,15 @@ void Report::readRecords()
 
 Value Report::fieldValue(const QString& text) const
 {
-    if (!m_lastPlan || !m_saved || m_currentRecord < 0
-        || m_currentRecord >= m_saved->records.size())
+    if (!m_lastPlan || !m_cache.saved() || m_currentRecord < 0
+        || m_currentRecord >= m_cache.saved()->records.size())
         return {};
     const auto found = m_lastPlan->references.find(text.toLower());
     if (found == m_lastPlan->references.end())
         return {};
     try {
-        return FormulaEvaluator::evaluate(*found->second, m_saved->records.record(m_currentRecord));
+        return FormulaEvaluator::evaluate(
+            *found->second, m_cache.saved()->records.record(m_currentRecord));
     } catch (const FormulaException& error) {
         formulaError(error);
     }
@@ -640,14 +344,14 @@ ReportDocument Report::document(bool withSavedData) const
         doc.parameters.push_back(p->definition());
     for (const auto& s : m_sections)
         doc.sections.push_back(s->definition());
-    if (withSavedData && m_saved) {
+    if (withSavedData && m_cache.saved()) {
         SavedData data;
-        data.columns = m_saved->columns;
-        data.recordsRead = m_saved->recordsRead;
-        data.signature = m_saved->signature;
-        for (qsizetype i = 0; i < m_saved->records.size(); ++i) {
-            const Value* record = m_saved->records.record(i);
-            data.rows.emplace_back(record, record + m_saved->records.columnCount());
+        data.columns = m_cache.saved()->columns;
+        data.recordsRead = m_cache.saved()->recordsRead;
+        data.signature = m_cache.saved()->signature;
+        for (qsizetype i = 0; i < m_cache.saved()->records.size(); ++i) {
+            const Value* record = m_cache.saved()->records.record(i);
+            data.rows.emplace_back(record, record + m_cache.saved()->records.columnCount());
         }
         doc.savedData = std::move(data);
     }

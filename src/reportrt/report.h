@@ -1,5 +1,6 @@
 #pragma once
 
+#include "reportrt/data/recordcache.h"
 #include "reportrt/data/recordprocessor.h"
 #include "reportrt/data/recordset.h"
 #include "reportrt/document/reportdocument.h"
@@ -16,7 +17,6 @@ class ExportOptions;
 class ParameterField;
 class ReportObject;
 class Section;
-class SqlConnection;
 
 /// An opened report (or subreport) of the runtime.
 ///
@@ -57,7 +57,7 @@ public:
     /// count is 1 to 9999.
     void setTopNGroupCount(const QString& areaName, int32_t count) override;
 
-    bool hasSavedData() const override { return m_saved.has_value(); }
+    bool hasSavedData() const override { return m_cache.saved().has_value(); }
     void discardSavedData() override;
     void readRecords() override;
     runtime::PrintingStatus printingStatus() const override { return m_status; }
@@ -103,7 +103,10 @@ public:
     /// Whether a formula or object refers to the parameter.
     bool usesParameter(const QString& name) const;
     /// The records of the last read, in the order RecordProcessor gives.
-    const RecordSet* records() const { return m_saved ? &m_saved->records : nullptr; }
+    const RecordSet* records() const
+    {
+        return m_cache.saved() ? &m_cache.saved()->records : nullptr;
+    }
     const RecordProcessor::Result* result() const { return m_result ? &*m_result : nullptr; }
     /// The record the layout is formatting (an index into records()), or -1.
     void setCurrentRecord(qsizetype index) { m_currentRecord = index; }
@@ -129,19 +132,9 @@ public:
     void setPrintingStatus(const runtime::PrintingStatus& status) { m_status = status; }
 
 private:
-    struct Plan;
-    struct Saved {
-        RecordSet records;
-        std::vector<QString> columns;
-        int recordsRead = 0;
-        QString signature;
-    };
-
     Report() = default;
     void build(const ReportDocument& document, const QString& fileName);
-    std::shared_ptr<Plan> plan(bool bindParameters) const;
-    SqlConnection& connection(const std::vector<ConnectionProperty>& properties);
-    void readInto(Plan& plan);
+    std::shared_ptr<QueryPlan> plan(bool bindParameters) const;
 
     QString m_fileName;
     ReportDocument m_document; // tables, parameters and sections live in the objects below
@@ -151,10 +144,9 @@ private:
     std::shared_ptr<ExportOptions> m_exportOptions;
     runtime::PrintingStatus m_status;
     NoDataHandler m_noDataHandler;
-    std::optional<Saved> m_saved;
+    RecordCache m_cache;
     std::optional<RecordProcessor::Result> m_result;
-    std::shared_ptr<Plan> m_lastPlan; // compiled with the last read, for field values
-    std::map<QString, std::unique_ptr<SqlConnection>> m_connections;
+    std::shared_ptr<QueryPlan> m_lastPlan; // compiled with the last read, for field values
     qsizetype m_currentRecord = -1;
     bool m_parameterPrompting = true;
     int32_t m_dialogParent = 0;
