@@ -1,7 +1,7 @@
 #include "core/collection.h"
 #include "core/dictionary.h"
 #include "core/eventsource.h"
-#include "coretest.h"
+#include "corefixture.h"
 
 using core::Collection;
 using core::Currency;

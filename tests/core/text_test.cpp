@@ -1,5 +1,5 @@
 #include "core/text.h"
-#include "coretest.h"
+#include "corefixture.h"
 
 using coretest::errorOf;
 using coretest::LocaleScope;

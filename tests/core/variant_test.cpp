@@ -1,5 +1,5 @@
 #include "core/dictionary.h"
-#include "coretest.h"
+#include "corefixture.h"
 
 using core::Currency;
 using core::Variant;

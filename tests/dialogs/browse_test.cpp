@@ -1,7 +1,7 @@
 #include "dialogs/frmcalendar.h"
 #include "dialogs/frmeditor.h"
 #include "platform/scripteddialogservice.h"
-#include "widgettest.h"
+#include "widgetfixture.h"
 
 #include <QPlainTextEdit>
 #include <QPushButton>

@@ -1,7 +1,7 @@
 #include "dialogs/calendarlayout.h"
 #include "dialogs/frmcalendar.h"
 #include "platform/settingsstore.h"
-#include "widgettest.h"
+#include "widgetfixture.h"
 
 #include <QCalendarWidget>
 #include <QLabel>

@@ -1,5 +1,5 @@
 #include "dialogs/dateentry.h"
-#include "dialogstest.h"
+#include "dialogsfixture.h"
 
 #include <QLocale>
 #include <gtest/gtest.h>

@@ -1,6 +1,6 @@
 #include "dialogs/combocompletion.h"
 #include "dialogs/numberentry.h"
-#include "dialogstest.h"
+#include "dialogsfixture.h"
 
 #include <QLocale>
 #include <gtest/gtest.h>

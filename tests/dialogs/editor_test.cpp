@@ -1,7 +1,7 @@
 #include "dialogs/editorlayout.h"
 #include "dialogs/frmeditor.h"
 #include "platform/settingsstore.h"
-#include "widgettest.h"
+#include "widgetfixture.h"
 
 #include <QFontDatabase>
 #include <QPlainTextEdit>

@@ -1,6 +1,6 @@
 #include "dialogs/dateentry.h"
 #include "dialogs/inputboxlayout.h"
-#include "widgettest.h"
+#include "widgetfixture.h"
 
 #include <QCheckBox>
 #include <QComboBox>

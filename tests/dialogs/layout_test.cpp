@@ -1,5 +1,5 @@
 #include "dialogs/inputboxlayout.h"
-#include "dialogstest.h"
+#include "dialogsfixture.h"
 
 #include <gtest/gtest.h>
 

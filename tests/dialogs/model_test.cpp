@@ -2,7 +2,7 @@
 #include "dialogs/inputboxparams.h"
 #include "dialogs/ludsettings.h"
 #include "dialogs/uistrings.h"
-#include "dialogstest.h"
+#include "dialogsfixture.h"
 #include "engine/moxglobals.h"
 #include "platform/settingsstore.h"
 

@@ -1,5 +1,5 @@
 #include "engine/luderrorhandler.h"
-#include "enginetest.h"
+#include "enginefixture.h"
 #include "reports/moxreports115.h"
 
 #include <QFile>

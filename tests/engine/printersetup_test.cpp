@@ -1,5 +1,5 @@
 #include "engine/ludpsetup.h"
-#include "enginetest.h"
+#include "enginefixture.h"
 #include "platform/currentprinter.h"
 #include "platform/printers.h"
 #include "platform/tempfolder.h"

@@ -1,4 +1,4 @@
-#include "enginetest.h"
+#include "enginefixture.h"
 
 namespace enginetest {
 namespace {

@@ -1,4 +1,4 @@
-#include "enginetest.h"
+#include "enginefixture.h"
 #include "platform/tempfolder.h"
 
 #include <QFile>

@@ -1,4 +1,4 @@
-#include "mailtest.h"
+#include "mailfixture.h"
 #include "platform/settingsstore.h"
 #include "reportrt/mail/maildelivery.h"
 #include "reportrt/mail/mailerror.h"

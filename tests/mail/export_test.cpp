@@ -1,6 +1,6 @@
 #include "core/comerror.h"
-#include "layouttest.h"
-#include "mailtest.h"
+#include "layoutfixture.h"
+#include "mailfixture.h"
 #include "platform/tempfolder.h"
 #include "reportrt/base/runtimeerror.h"
 #include "reportrt/exportoptions.h"

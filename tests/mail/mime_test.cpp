@@ -1,4 +1,4 @@
-#include "mailtest.h"
+#include "mailfixture.h"
 #include "reportrt/mail/mailaddress.h"
 #include "reportrt/mail/mailerror.h"
 #include "reportrt/mail/mimemessage.h"

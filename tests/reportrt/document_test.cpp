@@ -2,7 +2,7 @@
 #include "reportrt/base/runtimeerror.h"
 #include "reportrt/document/documentreader.h"
 #include "reportrt/report.h"
-#include "reportrttest.h"
+#include "reportrtfixture.h"
 #include "runtime/parameterfield.h"
 #include "runtime/reportobject.h"
 #include "runtime/section.h"

@@ -1,7 +1,7 @@
 #include "reportrt/formula/formulacompiler.h"
 #include "reportrt/formula/formulaevaluator.h"
 #include "reportrt/formula/formulaparser.h"
-#include "reportrttest.h"
+#include "reportrtfixture.h"
 
 #include <gtest/gtest.h>
 #include <vector>

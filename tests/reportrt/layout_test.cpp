@@ -1,5 +1,5 @@
 #include "core/comerror.h"
-#include "layouttest.h"
+#include "layoutfixture.h"
 #include "reportrt/base/runtimeerror.h"
 #include "reportrt/layout/fonttable.h"
 #include "reportrt/layout/layoutengine.h"

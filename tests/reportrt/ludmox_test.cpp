@@ -1,4 +1,4 @@
-#include "layouttest.h"
+#include "layoutfixture.h"
 
 #include <QDir>
 #include <QFile>

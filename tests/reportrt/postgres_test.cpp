@@ -2,7 +2,7 @@
 #include "reportrt/data/providermap.h"
 #include "reportrt/output/registerruntime.h"
 #include "reportrt/report.h"
-#include "reportrttest.h"
+#include "reportrtfixture.h"
 #include "runtime/application.h"
 #include "runtime/applicationfactory.h"
 

@@ -1,5 +1,5 @@
 #include "core/comerror.h"
-#include "layouttest.h"
+#include "layoutfixture.h"
 #include "platform/currentprinter.h"
 #include "platform/printdialogservice.h"
 #include "platform/printers.h"

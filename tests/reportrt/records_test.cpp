@@ -4,7 +4,7 @@
 #include "reportrt/data/providermap.h"
 #include "reportrt/output/registerruntime.h"
 #include "reportrt/report.h"
-#include "reportrttest.h"
+#include "reportrtfixture.h"
 #include "runtime/applicationfactory.h"
 #include "runtime/databasetable.h"
 #include "runtime/parameterfield.h"

@@ -2,7 +2,7 @@
 // Python's HTML parser (writers_check.py), LibreOffice and headless Chromium.
 
 #include "core/comerror.h"
-#include "layouttest.h"
+#include "layoutfixture.h"
 #include "reportrt/base/runtimeerror.h"
 #include "reportrt/exportoptions.h"
 #include "reportrt/output/htmlexporter.h"

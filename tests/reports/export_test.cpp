@@ -2,7 +2,7 @@
 // scratch file, the no-data and ValidMail rules, the replacement of the target and every
 // error mapping of the failure handler.
 
-#include "exporttest.h"
+#include "exportfixture.h"
 
 #include <QFileInfo>
 

@@ -1,5 +1,5 @@
 #include "reports/moxstatus115.h"
-#include "reporttest.h"
+#include "reportfixture.h"
 
 namespace {
 

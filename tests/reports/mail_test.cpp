@@ -2,7 +2,7 @@
 // no-data rules, the attachment name through a temporary copy of the report, and the
 // failure paths.
 
-#include "exporttest.h"
+#include "exportfixture.h"
 
 #include <QFileInfo>
 

@@ -2,7 +2,7 @@
 
 #include "dialogs/frminputbox.h"
 #include "platform/display.h"
-#include "reporttest.h"
+#include "reportfixture.h"
 
 #include <QApplication>
 #include <QCheckBox>

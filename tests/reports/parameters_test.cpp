@@ -1,6 +1,6 @@
 #include "core/collection.h"
 #include "dialogs/dateentrysettings.h"
-#include "reporttest.h"
+#include "reportfixture.h"
 
 #include <QLocale>
 

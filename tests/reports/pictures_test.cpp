@@ -3,7 +3,7 @@
 // images of the file store sized into their box.
 
 #include "platform/twips.h"
-#include "reporttest.h"
+#include "reportfixture.h"
 
 #include <QBuffer>
 #include <QFile>

@@ -6,7 +6,7 @@
 #include "platform/currentprinter.h"
 #include "platform/printers.h"
 #include "platform/windowhandles.h"
-#include "reporttest.h"
+#include "reportfixture.h"
 
 #include <QApplication>
 #include <QDir>

@@ -3,7 +3,7 @@
 
 #include "core/dictionary.h"
 #include "reportrt/output/registerruntime.h"
-#include "reporttest.h"
+#include "reportfixture.h"
 #include "runtime/applicationfactory.h"
 #include "runtime/report.h"
 #include "support/fulldisk.h"

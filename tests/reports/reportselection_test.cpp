@@ -1,5 +1,5 @@
 #include "core/collection.h"
-#include "reporttest.h"
+#include "reportfixture.h"
 
 namespace {
 

@@ -1,4 +1,4 @@
-#include "reporttest.h"
+#include "reportfixture.h"
 
 namespace {
 

@@ -5,7 +5,7 @@
 #include "dialogs/dateentrysettings.h"
 #include "dialogs/frminputbox.h"
 #include "dialogs/inputboxparams.h"
-#include "dialogstest.h"
+#include "dialogsfixture.h"
 #include "engine/moxglobals.h"
 
 #include <QApplication>

@@ -1,4 +1,4 @@
-#include "mailtest.h"
+#include "mailfixture.h"
 
 #include <QDir>
 #include <QFile>

@@ -1,4 +1,4 @@
-#include "reportrttest.h"
+#include "reportrtfixture.h"
 
 #include "core/variant.h"
 #include "reportrt/formula/formulaevaluator.h"

@@ -1,6 +1,6 @@
 #pragma once
 
-#include "reporttest.h"
+#include "reportfixture.h"
 
 #include <QDateTime>
 #include <QDir>

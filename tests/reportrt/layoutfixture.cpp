@@ -1,4 +1,4 @@
-#include "layouttest.h"
+#include "layoutfixture.h"
 
 #include "core/variant.h"
 #include "reportrt/layout/fonttable.h"
