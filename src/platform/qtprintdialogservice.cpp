@@ -80,6 +80,11 @@ PrintDialogService::Result QtPrintDialogService::show(const Request& request)
     preparePrinter(printer, request);
 
     QPrintDialog dialog(&printer, WindowHandles::findWidget(request.ownerWindow));
+    // Building the dialog selects a system queue on the printer itself whenever one exists -
+    // the default queue when the request is for the PDF printer - and that queue's paper and
+    // duplex replace the requested ones. Applied again, the request makes the dialog open on
+    // its PDF entry with the requested settings.
+    preparePrinter(printer, request);
     if (!dialog.parentWidget())
         WindowHandles::setOwner(&dialog, request.ownerWindow);
 
