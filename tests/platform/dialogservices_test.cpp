@@ -290,6 +290,7 @@ TEST(QtPrintDialog, OpensOnTheRequestedPrinterWhateverQueuesExist)
     const Row rows[] = {
         { "PDF printer, A5", pdf, 11, pdf, true },
         { "PDF printer, Legal", pdf, 5, pdf, true },
+        { "PDF printer, Architecture E, which a queue may not offer", pdf, 26, pdf, true },
         { "system queue", queue, 11, queue, false },
         { "queue that has gone away falls back to the PDF printer", u"LUDMox-Vanished"_s, 11, pdf,
             true },
