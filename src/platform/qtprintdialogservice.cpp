@@ -3,9 +3,7 @@
 #include "platform/printers.h"
 #include "platform/windowhandles.h"
 
-#include <QComboBox>
 #include <QDir>
-#include <QEvent>
 #include <QPrintDialog>
 #include <QPrinter>
 #include <QPrinterInfo>
@@ -52,26 +50,6 @@ PrintDialogService::PageRange pageRange(QPrinter::PrintRange range)
     return PrintDialogService::PageRange::All;
 }
 
-/// Qt's dialog opens on the system's default printer even for a printer set to PDF output
-/// once any print queue exists, and it chooses while it is being shown; the component's PDF
-/// printer is the dialog's file entry, so that entry is chosen as the dialog appears.
-class FileEntrySelector : public QObject {
-public:
-    using QObject::QObject;
-
-protected:
-    bool eventFilter(QObject* watched, QEvent* event) override
-    {
-        if (event->type() == QEvent::Show) {
-            watched->removeEventFilter(this);
-            auto* printers = watched->findChild<QComboBox*>(u"printers"_s);
-            if (printers && printers->count() > 0)
-                printers->setCurrentIndex(printers->count() - 1);
-        }
-        return false;
-    }
-};
-
 } // namespace
 
 PrintDialogService::Result QtPrintDialogService::show(const Request& request)
@@ -80,6 +58,11 @@ PrintDialogService::Result QtPrintDialogService::show(const Request& request)
     preparePrinter(printer, request);
 
     QPrintDialog dialog(&printer, WindowHandles::findWidget(request.ownerWindow));
+    // Building the dialog selects a system queue on the printer itself whenever one exists -
+    // the default queue when the request is for the PDF printer - and that queue's paper and
+    // duplex replace the requested ones. Applied again, the request makes the dialog open on
+    // its PDF entry with the requested settings.
+    preparePrinter(printer, request);
     if (!dialog.parentWidget())
         WindowHandles::setOwner(&dialog, request.ownerWindow);
 
@@ -98,10 +81,6 @@ PrintDialogService::Result QtPrintDialogService::show(const Request& request)
         const int fromPage = std::clamp(request.fromPage, minPage, request.maxPage);
         dialog.setFromTo(fromPage, std::clamp(request.toPage, fromPage, request.maxPage));
     }
-
-    FileEntrySelector selector;
-    if (request.printer.isVirtualPdf())
-        dialog.installEventFilter(&selector);
 
     Result result;
     if (dialog.exec() != QDialog::Accepted)

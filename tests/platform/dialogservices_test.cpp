@@ -6,12 +6,15 @@
 #include <QImage>
 #include <QPalette>
 #include <QPrintDialog>
+#include <QPrinter>
+#include <QPrinterInfo>
 #include <QTemporaryDir>
 #include <QTimer>
 #include <QWindow>
 #include <core/comerror.h>
 #include <functional>
 #include <gtest/gtest.h>
+#include <iostream>
 #include <platform/olecolor.h>
 #include <platform/printers.h>
 #include <platform/qtdialogservice.h>
@@ -260,6 +263,72 @@ TEST(QtPrintDialog, ShowsTheRequestAndReturnsTheChoice)
 
     whenShown<QPrintDialog>([](QPrintDialog* dialog) { dialog->reject(); });
     EXPECT_FALSE(service.show(request).accepted);
+    qunsetenv("LUDMOX_PDF_PRINTER_DIR");
+}
+
+// The dialog builds on the system's queues: whatever CUPS offers, it has to open on the printer
+// the request names and hand that printer back with the requested page.
+TEST(QtPrintDialog, OpensOnTheRequestedPrinterWhateverQueuesExist)
+{
+    QTemporaryDir folder;
+    qputenv("LUDMOX_PDF_PRINTER_DIR", QFile::encodeName(folder.path()));
+    const QStringList queues = QPrinterInfo::availablePrinterNames();
+    const QString queue = queues.contains(u"LUDMox-CUPS"_s) ? u"LUDMox-CUPS"_s
+        : queues.isEmpty()                                  ? QString()
+                                                            : queues.constFirst();
+    const QString pdf = Printers::virtualPdfDeviceName();
+
+    struct Row {
+        const char* name;
+        QString requested;
+        int16_t paperSize;
+        QString chosen;
+        // A CUPS queue's dialog shows the queue's default paper, so only the PDF printer can
+        // promise the requested one.
+        bool keepsPaper;
+    };
+    const Row rows[] = {
+        { "PDF printer, A5", pdf, 11, pdf, true },
+        { "PDF printer, Legal", pdf, 5, pdf, true },
+        { "PDF printer, Architecture E, which a queue may not offer", pdf, 26, pdf, true },
+        { "system queue", queue, 11, queue, false },
+        { "queue that has gone away falls back to the PDF printer", u"LUDMox-Vanished"_s, 11, pdf,
+            true },
+    };
+    platform::QtPrintDialogService service;
+    for (const Row& row : rows) {
+        SCOPED_TRACE(row.name);
+        if (row.requested.isEmpty()) {
+            std::cout << "no system print queue; skipped: " << row.name << std::endl;
+            continue;
+        }
+        PrintDialogService::Request request;
+        request.printer = row.requested == pdf
+            ? Printers::virtualPdfPrinter()
+            : platform::PrinterInfo(row.requested, u"CUPS"_s, row.requested);
+        request.settings.setPaperSize(row.paperSize);
+        request.settings.setOrientation(2);
+
+        bool shownOnPdf = false;
+        QString shownQueue;
+        whenShown<QPrintDialog>([&](QPrintDialog* dialog) {
+            shownOnPdf = dialog->printer()->outputFormat() == QPrinter::PdfFormat;
+            shownQueue = dialog->printer()->printerName();
+            dialog->accept();
+        });
+        const PrintDialogService::Result result = service.show(request);
+
+        EXPECT_EQ(shownOnPdf, row.chosen == pdf);
+        if (row.chosen != pdf) {
+            EXPECT_EQ(shownQueue, row.chosen);
+        }
+        ASSERT_TRUE(result.accepted);
+        EXPECT_EQ(result.printer.deviceName(), row.chosen);
+        EXPECT_EQ(result.settings.orientation(), 2);
+        if (row.keepsPaper) {
+            EXPECT_EQ(result.settings.paperSize(), row.paperSize);
+        }
+    }
     qunsetenv("LUDMOX_PDF_PRINTER_DIR");
 }
 
