@@ -1,5 +1,5 @@
-#include "outputlogging_p.h"
 #include "reportrt/base/durablefile_p.h"
+#include "reportrt/base/logging_p.h"
 
 #include <QFileInfo>
 #include <cerrno>
