@@ -132,6 +132,23 @@ qsizetype skipQuoted(const QString& sql, qsizetype i)
     return i;
 }
 
+// Whether the text ends inside a "--" comment: anything appended on its line would be
+// commented out.
+bool endsInLineComment(const QString& sql)
+{
+    for (qsizetype i = 0; i < sql.size();) {
+        const qsizetype next = skipQuoted(sql, i);
+        if (next == i) {
+            ++i;
+            continue;
+        }
+        if (next == sql.size() && sql.at(i) == u'-' && !sql.endsWith(u'\n'))
+            return true;
+        i = next;
+    }
+    return false;
+}
+
 // 0-based index of the last occurrence of keyword as a word of the outermost query, or -1.
 // Literals, quoted names, comments and parenthesised sub-queries are passed over: a
 // keyword there is text or belongs to another query, and a filter placed after it would
@@ -363,7 +380,9 @@ QString SpliceFilter(const QString& sql, const QString& filter, const QString& s
         qsizetype conditionStart = where + 5;
         while (conditionStart < head.size() && isSpace(head.at(conditionStart)))
             ++conditionStart;
-        const QString condition = trimmed(head.mid(conditionStart));
+        QString condition = trimmed(head.mid(conditionStart));
+        if (endsInLineComment(condition))
+            condition += crlf;
         qsizetype headEnd = where;
         while (headEnd > 0 && isSpace(head.at(headEnd - 1)))
             --headEnd;
