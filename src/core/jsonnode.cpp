@@ -9,6 +9,13 @@ JsonNode JsonNode::ofKind(Kind kind)
     return node;
 }
 
+JsonNode::JsonNode() = default;
+JsonNode::JsonNode(const JsonNode& other) = default;
+JsonNode::JsonNode(JsonNode&& other) noexcept = default;
+JsonNode& JsonNode::operator=(const JsonNode& other) = default;
+JsonNode& JsonNode::operator=(JsonNode&& other) noexcept = default;
+JsonNode::~JsonNode() = default;
+
 JsonNode JsonNode::fromBool(bool value)
 {
     JsonNode node = ofKind(Kind::Boolean);

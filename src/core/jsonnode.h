@@ -17,6 +17,15 @@ namespace core {
 struct JsonNode {
     enum class Kind { Null, Boolean, Number, String, Array, Object };
 
+    // Declared here and defaulted in the source: clang with libstdc++ cannot work out the
+    // implicit ones while the vectors below still name an incomplete JsonNode.
+    JsonNode();
+    JsonNode(const JsonNode& other);
+    JsonNode(JsonNode&& other) noexcept;
+    JsonNode& operator=(const JsonNode& other);
+    JsonNode& operator=(JsonNode&& other) noexcept;
+    ~JsonNode();
+
     Kind kind = Kind::Null;
     TextPosition position;
     bool boolean = false;

@@ -5,6 +5,8 @@
 #include "core/text.h"
 
 #include <QRegularExpression>
+#include <algorithm>
+#include <cmath>
 #include <vector>
 
 namespace reports::SelectionText {
@@ -25,7 +27,9 @@ QString trimmed(const QString& text)
 
 bool isPlainNumber(const QString& text)
 {
-    static const QRegularExpression number(QStringLiteral("^[-+]?\\d+(\\.\\d+)?$"));
+    // Anchored at the very end: "$" would also take a number followed by a line break.
+    static const QRegularExpression number(
+        QRegularExpression::anchoredPattern(QStringLiteral("[-+]?[0-9]+(\\.[0-9]+)?")));
     return number.match(trimmed(text)).hasMatch();
 }
 
@@ -35,8 +39,12 @@ QString inListElement(const core::Variant& element)
 {
     if (element.type() == core::VariantType::Null)
         return QStringLiteral("NULL");
-    if (core::isNumberType(element.type()))
+    if (core::isNumberType(element.type())) {
+        // Infinity and NaN would be written as names ("inf", "nan"); no ID equals them.
+        if (!std::isfinite(element.toDouble()))
+            return QStringLiteral("NULL");
         return element.toInvariantText();
+    }
     if (element.type() == core::VariantType::Boolean)
         return element.toBoolean() ? QStringLiteral("-1") : QStringLiteral("0");
     const QString text = element.type() == core::VariantType::String ? element.toText()
@@ -86,10 +94,88 @@ bool isSpace(QChar c)
         || c == QLatin1Char('\n');
 }
 
-// 0-based index of the last occurrence of keyword, or -1.
+bool isWordChar(QChar c)
+{
+    return c.isLetterOrNumber() || c == u'_';
+}
+
+// The index after a literal, quoted name or comment that starts at `i`, or `i` when none
+// does. One left open runs to the end of the statement.
+qsizetype skipQuoted(const QString& sql, qsizetype i)
+{
+    const QChar c = sql.at(i);
+    const auto closeAt = [&](QChar close) {
+        for (qsizetype j = i + 1; j < sql.size(); ++j) {
+            if (sql.at(j) != close)
+                continue;
+            // A doubled quote stands for the quote itself.
+            if (close != u']' && j + 1 < sql.size() && sql.at(j + 1) == close) {
+                ++j;
+                continue;
+            }
+            return j + 1;
+        }
+        return sql.size();
+    };
+    if (c == u'\'' || c == u'"' || c == u'`')
+        return closeAt(c);
+    if (c == u'[')
+        return closeAt(u']');
+    if (c == u'-' && i + 1 < sql.size() && sql.at(i + 1) == u'-') {
+        const qsizetype end = sql.indexOf(u'\n', i);
+        return end < 0 ? sql.size() : end + 1;
+    }
+    if (c == u'/' && i + 1 < sql.size() && sql.at(i + 1) == u'*') {
+        const qsizetype end = sql.indexOf(QStringLiteral("*/"), i + 2);
+        return end < 0 ? sql.size() : end + 2;
+    }
+    return i;
+}
+
+// Whether the text ends inside a "--" comment: anything appended on its line would be
+// commented out.
+bool endsInLineComment(const QString& sql)
+{
+    for (qsizetype i = 0; i < sql.size();) {
+        const qsizetype next = skipQuoted(sql, i);
+        if (next == i) {
+            ++i;
+            continue;
+        }
+        if (next == sql.size() && sql.at(i) == u'-' && !sql.endsWith(u'\n'))
+            return true;
+        i = next;
+    }
+    return false;
+}
+
+// 0-based index of the last occurrence of keyword as a word of the outermost query, or -1.
+// Literals, quoted names, comments and parenthesised sub-queries are passed over: a
+// keyword there is text or belongs to another query, and a filter placed after it would
+// be lost in a literal or restrict the wrong query.
 qsizetype lastKeyword(const QString& sql, const QString& keyword)
 {
-    return sql.lastIndexOf(keyword, -1, Qt::CaseInsensitive);
+    qsizetype found = -1;
+    int depth = 0;
+    for (qsizetype i = 0; i < sql.size();) {
+        const qsizetype next = skipQuoted(sql, i);
+        if (next != i) {
+            i = next;
+            continue;
+        }
+        const QChar c = sql.at(i);
+        if (c == u'(') {
+            ++depth;
+        } else if (c == u')') {
+            depth = std::max(0, depth - 1);
+        } else if (depth == 0 && (i == 0 || !isWordChar(sql.at(i - 1)))
+            && QStringView(sql).mid(i).startsWith(keyword, Qt::CaseInsensitive)
+            && (i + keyword.size() == sql.size() || !isWordChar(sql.at(i + keyword.size())))) {
+            found = i;
+        }
+        ++i;
+    }
+    return found;
 }
 
 } // namespace
@@ -261,7 +347,7 @@ QString SpliceFilter(const QString& sql, const QString& filter, const QString& s
     const QString& formulaClause)
 {
     const qsizetype from = lastKeyword(sql, QStringLiteral("FROM"));
-    // A keyword before the last FROM belongs to a sub-query.
+    // A keyword before the last FROM belongs to a query joined before it (a UNION).
     const auto afterFrom = [&](qsizetype position) { return position > from ? position : -1; };
     const qsizetype where = afterFrom(lastKeyword(sql, QStringLiteral("WHERE")));
     const qsizetype orderBy = afterFrom(lastKeyword(sql, QStringLiteral("ORDER BY")));
@@ -294,7 +380,9 @@ QString SpliceFilter(const QString& sql, const QString& filter, const QString& s
         qsizetype conditionStart = where + 5;
         while (conditionStart < head.size() && isSpace(head.at(conditionStart)))
             ++conditionStart;
-        const QString condition = trimmed(head.mid(conditionStart));
+        QString condition = trimmed(head.mid(conditionStart));
+        if (endsInLineComment(condition))
+            condition += crlf;
         qsizetype headEnd = where;
         while (headEnd > 0 && isSpace(head.at(headEnd - 1)))
             --headEnd;

@@ -3,6 +3,7 @@
 
 #include <QLocale>
 #include <gtest/gtest.h>
+#include <limits>
 
 using namespace reports::SelectionText;
 
@@ -142,6 +143,15 @@ TEST(SelectionRequest, TextElementsAreQuotedAndNumbersStayInvariant)
     QLocale::setDefault(saved);
 }
 
+TEST(SelectionRequest, ValuesThatAreNotExactlyNumbersCannotLeaveTheList)
+{
+    const auto values = core::VariantArray::fromList(
+        { QStringLiteral("5\n"), std::numeric_limits<double>::infinity(),
+            std::numeric_limits<double>::quiet_NaN(), QStringLiteral(" 7 ") });
+    EXPECT_EQ(BuildRequest(QStringLiteral("T"), values).listClause,
+        QStringLiteral("T.ID IN ('5\n',NULL,NULL,7)"));
+}
+
 TEST(SelectionRequest, CollectionsListTheirItems)
 {
     auto collection = std::make_shared<core::Collection>();
@@ -206,6 +216,26 @@ TEST(SqlRewrite, SplicesTheFilterAfterTheLastFrom)
         { "one-line command", QStringLiteral("SELECT * FROM Orders WHERE Open = 1 ORDER BY ID"),
             QStringLiteral("SELECT * FROM Orders\r\nWHERE\r\n    Open = 1 AND (Orders.ID IN "
                            "(3,7)) ORDER BY ID") },
+        // Keywords in literals, names and comments are text, not clauses.
+        { "keyword inside a literal", QStringLiteral("SELECT a FROM t WHERE n = 'x ORDER BY y'"),
+            QStringLiteral("SELECT a FROM t\r\nWHERE\r\n    (n = 'x ORDER BY y') AND (Orders.ID "
+                           "IN (3,7))") },
+        { "keyword inside a comment and a quoted name",
+            lines({ u"SELECT [FROM x] FROM t -- WHERE y", u"" }),
+            lines({ u"SELECT [FROM x] FROM t -- WHERE y", u"", u"WHERE",
+                u"    Orders.ID IN (3,7)" }) },
+        // The outermost query's WHERE takes the filter, not the last sub-query's.
+        { "sub-query inside the condition",
+            QStringLiteral("SELECT a FROM t WHERE x IN (SELECT b FROM u WHERE c = 1)"),
+            QStringLiteral("SELECT a FROM t\r\nWHERE\r\n    x IN (SELECT b FROM u WHERE c = 1) "
+                           "AND (Orders.ID IN (3,7))") },
+        // A condition ending in a comment would swallow the filter on the same line.
+        { "condition ending in a comment",
+            QStringLiteral("SELECT a FROM t WHERE x = 1 -- open only"),
+            QStringLiteral("SELECT a FROM t\r\nWHERE\r\n    x = 1 -- open only\r\n AND "
+                           "(Orders.ID IN (3,7))") },
+        { "keyword as part of a name", QStringLiteral("SELECT NOWHERE FROM FROMAGE"),
+            lines({ u"SELECT NOWHERE FROM FROMAGE", u"WHERE", u"    Orders.ID IN (3,7)" }) },
     };
     for (const Case& c : cases)
         EXPECT_EQ(SpliceFilter(c.sql, filter, QString(), QString()), c.expected) << c.name;
