@@ -1,5 +1,5 @@
-#include "reports/moxstatus115.h"
 #include "reportfixture.h"
+#include "reports/moxstatus115.h"
 
 namespace {
 

@@ -2,8 +2,8 @@
 // the selection reaches the runtime's formula and statement, and the records read follow.
 
 #include "core/dictionary.h"
-#include "reportrt/output/registerruntime.h"
 #include "reportfixture.h"
+#include "reportrt/output/registerruntime.h"
 #include "runtime/applicationfactory.h"
 #include "runtime/report.h"
 #include "support/fulldisk.h"
