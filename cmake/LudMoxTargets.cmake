@@ -52,3 +52,16 @@ function(ludmox_add_test name)
         ENVIRONMENT "QT_QPA_PLATFORM=offscreen;LUDMOX_TEST_DATA=${PROJECT_SOURCE_DIR}/tests/data;${ARG_ENVIRONMENT}"
         TIMEOUT 600)
 endfunction()
+
+# ludmox_add_python_test(<name> <script>): a host written in Python, run as CTest test <name>
+# with the server, the command line, the examples and the Python client at hand.
+function(ludmox_add_python_test name script)
+    find_package(Python3 COMPONENTS Interpreter)
+    if(NOT Python3_Interpreter_FOUND)
+        return()
+    endif()
+    add_test(NAME ${name} COMMAND ${Python3_EXECUTABLE} ${script} -v)
+    set_tests_properties(${name} PROPERTIES
+        ENVIRONMENT "QT_QPA_PLATFORM=offscreen;LUDMOX_LUDMOXD=$<TARGET_FILE:ludmoxd>;LUDMOX_CLI=$<TARGET_FILE:ludmox>;LUDMOX_EXAMPLES=${PROJECT_SOURCE_DIR}/examples;PYTHONPATH=${PROJECT_SOURCE_DIR}/python"
+        TIMEOUT 300)
+endfunction()
