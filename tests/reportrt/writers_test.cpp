@@ -13,6 +13,7 @@
 #include <QJsonDocument>
 #include <QJsonObject>
 #include <QProcess>
+#include <QRegularExpression>
 #include <QSqlDatabase>
 #include <QSqlError>
 #include <QSqlQuery>
@@ -548,6 +549,26 @@ TEST_F(Writers, AReadOnlyTargetIsReplacedAndAFileAsFolderFails)
         EXPECT_THROW(exportAs(*report, format, dir.filePath(u"sales.db/x"_s)), core::ComError);
         EXPECT_EQ(folderEntries(out), QStringList());
     }
+}
+
+TEST(HtmlStackedObjects, KeepTheirOwnFont)
+{
+    // The sample's subtitle sits under its title in one column: it must not take the
+    // title's 18 pt bold, which it would inherit from the cell.
+    auto report = openExample(u"sales-by-country.rpt"_s);
+    QTemporaryDir dir;
+    const QString path = dir.filePath(u"report.html"_s);
+    exportAs(*report, 32, path);
+    QFile file(path);
+    ASSERT_TRUE(file.open(QIODevice::ReadOnly));
+    const QString html = QString::fromUtf8(file.readAll());
+    const QRegularExpression stacked(u"<div class=\"(o\\d+)\">Orders, revenue"_s);
+    const QRegularExpressionMatch match = stacked.match(html);
+    ASSERT_TRUE(match.hasMatch()) << html.left(2000).toStdString();
+    const QRegularExpression rule(u"\\."_s + match.captured(1) + u"\\{([^}]*)\\}"_s);
+    const QString css = rule.match(html).captured(1);
+    EXPECT_TRUE(css.contains(u"font-size:9pt"_s)) << css.toStdString();
+    EXPECT_TRUE(css.contains(u"font-weight:normal"_s)) << css.toStdString();
 }
 
 } // namespace

@@ -226,12 +226,10 @@ private:
         const QByteArray name = "o" + QByteArray::number(m_objectClasses.size());
         QByteArray rule = "." + name + "{font-family:" + cssFamily(def.font.family)
             + ";font-size:" + QByteArray::number(def.font.pointSize, 'g', 4) + "pt";
-        if (def.font.bold)
-            rule += ";font-weight:bold";
-        if (def.font.italic)
-            rule += ";font-style:italic";
-        if (def.font.underline)
-            rule += ";text-decoration:underline";
+        // Said either way: an object stacked under another in its cell inherits the rest.
+        rule += def.font.bold ? ";font-weight:bold" : ";font-weight:normal";
+        rule += def.font.italic ? ";font-style:italic" : ";font-style:normal";
+        rule += def.font.underline ? ";text-decoration:underline" : ";text-decoration:none";
         rule += ";color:" + cssColor(def.color);
         static const char* const aligns[] = { "left", "center", "right", "justify" };
         rule += ";text-align:";
@@ -341,6 +339,9 @@ private:
                 row.cells.push_back({ {}, openCell(column, column + 1, {}) });
             row.cells.push_back(
                 { p.objects, openCell(p.first, p.last, objectClass(*p.objects.front())) });
+            // The style sheet is written before the rows: every stacked object's rule now.
+            for (const ReportObject* stacked : p.objects)
+                objectClass(*stacked);
             column = p.last;
         }
         for (; column < static_cast<int>(columns); ++column)
@@ -376,9 +377,15 @@ private:
         for (const Cell& cell : row.cells) {
             m_out += cell.open;
             for (size_t i = 0; i < cell.objects.size(); ++i) {
-                if (i > 0)
-                    m_out += "<br>";
+                if (i == 0) {
+                    appendObject(*cell.objects[i]);
+                    continue;
+                }
+                // Objects stacked in one column keep their own font, colour and alignment;
+                // the cell's class is the first one's.
+                m_out += "<div class=\"" + objectClass(*cell.objects[i]) + "\">";
                 appendObject(*cell.objects[i]);
+                m_out += "</div>";
             }
             m_out += "</td>";
         }
