@@ -35,7 +35,7 @@ function(ludmox_add_library name)
     add_library(LudMox::${ARG_ALIAS} ALIAS ${name})
     target_include_directories(${name} PUBLIC
         $<BUILD_INTERFACE:${PROJECT_SOURCE_DIR}/src>
-        $<INSTALL_INTERFACE:include/ludmox>)
+        $<BUILD_INTERFACE:${PROJECT_BINARY_DIR}/include>)
     target_link_libraries(${name} PUBLIC ${ARG_PUBLIC_LIBS} PRIVATE ${ARG_PRIVATE_LIBS})
     set_target_properties(${name} PROPERTIES POSITION_INDEPENDENT_CODE ON)
     ludmox_configure_target(${name})

@@ -14,6 +14,7 @@ packages=(
     postgresql postgresql-client
     fonts-dejavu-core xvfb xauth
     cups cups-bsd cups-client printer-driver-cups-pdf
+    help2man man-db
 )
 
 missing=()

@@ -1,6 +1,7 @@
 #include "exportcommand.h"
 
 #include "core/comerror.h"
+#include "logon.h"
 #include "reporthost.h"
 #include "reports/moxreport115.h"
 #include "reports/moxstatus115.h"
@@ -83,7 +84,7 @@ int exportCommand(const QStringList& arguments)
     }
     int failures = 0;
     try {
-        ReportHost host(parser.value(u"database"_s));
+        ReportHost host(Logon::fromOptions(parser));
         QStringList paths = parser.positionalArguments().mid(1);
         if (paths.isEmpty()) {
             const QDir folder(parser.value(u"reports"_s));

@@ -1,6 +1,7 @@
 #include "mailcommand.h"
 
 #include "core/comerror.h"
+#include "logon.h"
 #include "reporthost.h"
 #include "reports/moxreport115.h"
 
@@ -68,7 +69,7 @@ int mailCommand(const QStringList& arguments)
     }
 
     try {
-        ReportHost host(parser.value(u"database"_s));
+        ReportHost host(Logon::fromOptions(parser));
         try {
             const auto report = host.open(reportPaths.front(), parser);
             report->ValidMail(true);

@@ -1,15 +1,9 @@
 // ludmox: the command-line host of LUD Mox. It drives the component as a host application
-// does and exports, mails or prints reports from the shell.
-//
-//   ludmox export REPORT... --format pdf|xlsx|html --output DIR --database DB
-//                [--param NAME=VALUE]... [--selection FORMULA]
-//   ludmox mail REPORT --to ADDRESS [--cc ADDRESS] [--bcc ADDRESS] [--subject TEXT]
-//                [--message TEXT] [--format pdf|xlsx|html] --database DB
-//   ludmox print --database DB [--printer NAME] [--copies N] [--pages FROM-TO] [--paper CODE]
-//                [--param NAME=VALUE]... REPORT.rpt
-//   ludmox printers
+// does and exports, mails or prints reports from the shell; `ludmox --help` tells how.
 
 #include "exportcommand.h"
+#include "logon.h"
+#include "ludmox/version.h"
 #include "mailcommand.h"
 #include "printcommand.h"
 #include "reportrt/output/registerruntime.h"
@@ -39,6 +33,8 @@ int main(int argc, char* argv[])
     QApplication::setApplicationName(QStringLiteral("ludmox"));
     reportrt::registerRuntime();
 
+    QApplication::setApplicationVersion(QStringLiteral(LUDMOX_VERSION_STRING));
+
     const QStringList arguments = QApplication::arguments();
     if (arguments.value(1) == u"export")
         return exportCommand(arguments);
@@ -46,14 +42,30 @@ int main(int argc, char* argv[])
         return mailCommand(arguments);
 
     QCommandLineParser parser;
-    parser.setApplicationDescription(
-        QStringLiteral("Exports, mails and prints LUD Mox reports. Commands: export, mail, "
-                       "print, printers; COMMAND --help tells more."));
+    parser.setApplicationDescription(QStringLiteral(
+        "Exports, mails and prints LUD Mox reports, driving the component as a host "
+        "application does.\n"
+        "\n"
+        "Commands (COMMAND --help tells every option):\n"
+        "  export REPORT...  write PDF, Excel or HTML files (--format, --output)\n"
+        "  mail REPORT       mail a report as an attachment (--to, --subject, --format)\n"
+        "  print REPORT      print on a printer (--printer, --copies, --pages, --paper)\n"
+        "  printers          list the printers, the current one marked\n"
+        "\n"
+        "Every report command takes --logon (sqlite:FILE, postgres://... or odbc://...) or "
+        "--database FILE, --param NAME=VALUE (repeatable) and --selection FORMULA.\n"
+        "\n"
+        "Exit codes: 0 everything was written, sent or printed; 1 a report failed (one line "
+        "on standard error for each); 2 the command line or the database was wrong, nothing "
+        "was done.\n"
+        "\n"
+        "Settings: ~/.config/ludmox/ludmox.conf over /etc/xdg/ludmox/ludmox.conf, with "
+        "LUDMOX_* variables over both."));
     parser.addHelpOption();
+    parser.addVersionOption();
     parser.addPositionalArgument(
         QStringLiteral("command"), QStringLiteral("export, mail, print or printers"));
-    parser.addOption({ QStringLiteral("database"),
-        QStringLiteral("The SQLite database the reports read."), QStringLiteral("file") });
+    Logon::addOptions(parser);
     parser.addOption({ QStringLiteral("param"), QStringLiteral("A parameter value for the report."),
         QStringLiteral("name=value") });
     ludmox::addPrintOptions(parser);
@@ -64,6 +76,7 @@ int main(int argc, char* argv[])
         return ludmox::printReport(parser);
     if (command == u"printers")
         return ludmox::listPrinters();
-    printError(QStringLiteral("unknown command %1; try --help").arg(command));
+    printError(command.isEmpty() ? QStringLiteral("no command; try --help")
+                                 : QStringLiteral("unknown command %1; try --help").arg(command));
     return 2;
 }

@@ -3,6 +3,7 @@
 #include "core/comerror.h"
 #include "core/dictionary.h"
 #include "engine/moxengine115.h"
+#include "logon.h"
 #include "platform/currentprinter.h"
 #include "platform/printers.h"
 #include "reports/moxreport115.h"
@@ -13,6 +14,7 @@
 #include <QCommandLineParser>
 #include <QFileInfo>
 #include <QRegularExpression>
+#include <optional>
 #include <cstdio>
 
 using namespace Qt::StringLiterals;
@@ -72,9 +74,12 @@ int printReport(const QCommandLineParser& parser)
     const QString reportFile = QFileInfo(arguments.at(1)).absoluteFilePath();
     if (!QFileInfo(reportFile).isFile())
         return fail(u"the report %1 does not exist"_s.arg(reportFile), 2);
-    const QString database = QFileInfo(parser.value(u"database"_s)).absoluteFilePath();
-    if (parser.value(u"database"_s).isEmpty() || !QFileInfo(database).isFile())
-        return fail(u"print needs --database with an existing database file"_s, 2);
+    std::optional<Logon> logon;
+    try {
+        logon = Logon::fromOptions(parser);
+    } catch (const core::ComError& error) {
+        return fail(error.description(), 2);
+    }
 
     const std::optional<int16_t> copies = positive(parser.value(u"copies"_s));
     if (!copies)
@@ -126,7 +131,7 @@ int printReport(const QCommandLineParser& parser)
     try {
         const auto moxEngine = std::make_shared<engine::MoxEngine115>();
         moxEngine->Init(3, false, 0, 0);
-        moxEngine->SetLogonInfo(engine::ecstMSJET40, database, QString(), QString(), QString());
+        logon->apply(*moxEngine);
         const auto collection = moxEngine->GetReports();
         const auto report = collection->Item(reportFile);
         report->SetParams(parameters);

@@ -7,6 +7,7 @@
 #include "dialogs/inputboxparams.h"
 #include "dialogs/inputboxparamsitem.h"
 #include "engine/moxengine115.h"
+#include "logon.h"
 #include "reports/moxreport115.h"
 #include "reports/moxreports115.h"
 #include "reports/moxviewer6exeglobals.h"
@@ -48,8 +49,7 @@ void keepReportWarnings(QtMsgType type, const QMessageLogContext& context, const
 
 void ReportHost::addReportOptions(QCommandLineParser& parser)
 {
-    parser.addOption(
-        { u"database"_s, u"The SQLite database file the reports read (required)."_s, u"file"_s });
+    Logon::addOptions(parser);
     parser.addOption({ u"param"_s, u"A parameter value for every report (repeat for more)."_s,
         u"name=value"_s });
     parser.addOption({ u"selection"_s,
@@ -58,19 +58,13 @@ void ReportHost::addReportOptions(QCommandLineParser& parser)
         u"formula"_s });
 }
 
-ReportHost::ReportHost(const QString& database)
+ReportHost::ReportHost(const Logon& logon)
 {
-    if (database.isEmpty())
-        throw userError(u"give the database with --database FILE"_s);
-    const QString path = QFileInfo(database).absoluteFilePath();
-    if (!QFileInfo(path).isFile())
-        throw userError(u"the database %1 does not exist"_s.arg(path));
     if (!previousHandler)
         previousHandler = qInstallMessageHandler(keepReportWarnings);
     m_engine = std::make_shared<engine::MoxEngine115>();
     m_engine->Init(english, false, 0, 0);
-    // A Jet logon names the database file as its server.
-    m_engine->SetLogonInfo(engine::ecstMSJET, path, QString(), u"admin"_s, QString());
+    logon.apply(*m_engine);
     m_reports = m_engine->GetReports();
     reports::SetInputBoxPresenter([this](const std::shared_ptr<dialogs::InputBoxParams>& params,
                                       int32_t, const QString&, int32_t) {

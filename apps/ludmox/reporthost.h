@@ -4,6 +4,7 @@
 #include <QStringList>
 #include <memory>
 
+class Logon;
 class QCommandLineParser;
 
 namespace engine {
@@ -17,19 +18,18 @@ namespace core {
 class ComError;
 }
 
-/// What the command line does as a host application: one engine logged on to a SQLite
-/// database file, reports opened through its collection with the user's parameter values
+/// What the command line does as a host application: one engine logged on to the user's
+/// database, reports opened through its collection with the user's parameter values
 /// and selection. The parameter dialog is never shown (a shell may have no display): the
 /// parameters the user did not give take the values the dialog would start with (the
 /// designer's defaults), and one without such a value fails the report with a message
 /// naming it.
 class ReportHost {
 public:
-    /// --database, --param and --selection, which every report command takes.
+    /// --logon, --database, --param and --selection, which every report command takes.
     static void addReportOptions(QCommandLineParser& parser);
 
-    /// Raises core::ComError with a message for the user when the database does not exist.
-    explicit ReportHost(const QString& database);
+    explicit ReportHost(const Logon& logon);
     ~ReportHost();
     ReportHost(const ReportHost&) = delete;
     ReportHost& operator=(const ReportHost&) = delete;

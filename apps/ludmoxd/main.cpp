@@ -4,15 +4,57 @@
 #include "automation/registry.h"
 #include "automation/server.h"
 #include "dialogcanceller.h"
+#include "ludmox/version.h"
 #include "reportrt/output/registerruntime.h"
 
 #include <QApplication>
+#include <QCommandLineParser>
 #include <csignal>
+#include <cstdlib>
 #include <cstdio>
 #include <unistd.h>
 
+namespace {
+
+/// Answers --help and --version on standard output and ends the process; refuses anything
+/// else on the command line. The server itself takes no arguments.
+void answerCommandLine(int argc, char* argv[])
+{
+    const QCoreApplication application(argc, argv);
+    QCoreApplication::setApplicationName(QStringLiteral("ludmoxd"));
+    QCoreApplication::setApplicationVersion(QStringLiteral(LUDMOX_VERSION_STRING));
+    QCommandLineParser parser;
+    parser.setApplicationDescription(QStringLiteral(
+        "The automation server of the LUD Mox reporting component. A host starts it and "
+        "talks JSON-RPC 2.0 with it over standard input and output, one JSON object per "
+        "line; standard error carries diagnostics only. The host sends typelib, create, "
+        "invoke, enumerate, connect, disconnect, release and shutdown; the server sends "
+        "event and serves the host's calls made from inside its event handlers.\n"
+        "\n"
+        "The server ends when its input closes or after shutdown, releasing every object "
+        "the host still held, with exit code 0; 1 means it could not start. Without a "
+        "display its windows and dialogs run offscreen, and a dialog nobody can answer "
+        "counts as cancelled.\n"
+        "\n"
+        "Settings: ~/.config/ludmox/ludmox.conf over /etc/xdg/ludmox/ludmox.conf, with "
+        "LUDMOX_* variables over both."));
+    parser.addHelpOption();
+    parser.addVersionOption();
+    parser.process(application);
+    if (!parser.positionalArguments().isEmpty()) {
+        std::fputs("ludmoxd: takes no arguments; try --help\n", stderr);
+        std::exit(1);
+    }
+}
+
+} // namespace
+
 int main(int argc, char* argv[])
 {
+    // Before standard output becomes the protocol's: help goes where the user reads it.
+    if (argc > 1)
+        answerCommandLine(argc, argv);
+
     // Dialogs and preview windows need a platform; without a display they run offscreen.
     if (qEnvironmentVariableIsEmpty("DISPLAY") && qEnvironmentVariableIsEmpty("WAYLAND_DISPLAY")
         && qEnvironmentVariableIsEmpty("QT_QPA_PLATFORM"))

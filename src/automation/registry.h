@@ -1,6 +1,7 @@
 #pragma once
 
 #include "automation/classdescription.h"
+#include "core/ludmoxexport.h"
 
 #include <QHash>
 #include <QString>
@@ -13,7 +14,7 @@ namespace automation {
 /// The class descriptions every automation path reads: the server, the type library and
 /// late-bound calls inside the process. Classes are found by the name their objects report
 /// through core::Object::className(), without regard to case.
-class Registry {
+class LUDMOX_EXPORT Registry {
 public:
     /// An empty registry.
     Registry();

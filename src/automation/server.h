@@ -1,5 +1,7 @@
 #pragma once
 
+#include "core/ludmoxexport.h"
+
 #include <functional>
 #include <memory>
 
@@ -14,7 +16,7 @@ class Registry;
 ///
 /// The server ends when its input closes or after `shutdown`, and then lets go of every
 /// object the host still held.
-class Server {
+class LUDMOX_EXPORT Server {
 public:
     /// Reads requests from `input` and writes answers to `output` (file descriptors the
     /// caller keeps open). Needs a QCoreApplication for the event loop.

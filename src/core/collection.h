@@ -1,5 +1,6 @@
 #pragma once
 
+#include "core/ludmoxexport.h"
 #include "core/object.h"
 #include "core/variant.h"
 
@@ -10,7 +11,7 @@ namespace core {
 
 /// The Basic Collection: ordered, 1-based, optional string keys compared without regard to
 /// case, each key at most once.
-class Collection : public Object {
+class LUDMOX_EXPORT Collection : public Object {
 public:
     QString className() const override { return QStringLiteral("Collection"); }
 

@@ -1,5 +1,7 @@
 #pragma once
 
+#include "core/ludmoxexport.h"
+
 #include <QString>
 #include <cstdint>
 #include <exception>
@@ -49,7 +51,7 @@ constexpr int32_t ElementNotFound = 32811;
 
 /// An automation error: what Err.Raise raises and an error trap catches. The description
 /// must never carry a password or other secret: it travels to hosts and into logs.
-class ComError : public std::exception {
+class LUDMOX_EXPORT ComError : public std::exception {
 public:
     ComError(int32_t number, QString source, QString description);
 

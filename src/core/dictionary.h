@@ -1,5 +1,6 @@
 #pragma once
 
+#include "core/ludmoxexport.h"
 #include "core/object.h"
 #include "core/variant.h"
 
@@ -9,7 +10,7 @@ namespace core {
 
 /// Scripting.Dictionary: ordered key/item pairs. Binary compare mode (0) compares text keys
 /// exactly; text compare mode (1) without regard to case. Numeric keys compare by value.
-class Dictionary : public Object {
+class LUDMOX_EXPORT Dictionary : public Object {
 public:
     enum CompareMode : int32_t { BinaryCompare = 0, TextCompare = 1 };
 

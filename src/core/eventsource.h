@@ -1,5 +1,6 @@
 #pragma once
 
+#include "core/ludmoxexport.h"
 #include "core/variant.h"
 
 #include <QString>
@@ -14,7 +15,7 @@ namespace core {
 /// The outgoing (event) interface of an object. Handlers receive the event's dispatch id,
 /// its name and its arguments in declaration order; a handler writes by-reference results
 /// into the arguments. Handlers run in the order they were connected.
-class EventSource {
+class LUDMOX_EXPORT EventSource {
 public:
     using Handler
         = std::function<void(int32_t dispid, const QString& name, std::span<Variant> args)>;

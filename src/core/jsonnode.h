@@ -1,5 +1,6 @@
 #pragma once
 
+#include "core/ludmoxexport.h"
 #include "core/textposition.h"
 
 #include <QString>
@@ -14,7 +15,7 @@ namespace core {
 /// position of every fault it finds, not only of syntax errors. Objects keep their
 /// members in the order written, and numbers remember whether they were written as
 /// integers ("2" is not "2.0").
-struct JsonNode {
+struct LUDMOX_EXPORT JsonNode {
     enum class Kind { Null, Boolean, Number, String, Array, Object };
 
     // Declared here and defaulted in the source: clang with libstdc++ cannot work out the

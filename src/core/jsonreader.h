@@ -1,6 +1,7 @@
 #pragma once
 
 #include "core/jsonnode.h"
+#include "core/ludmoxexport.h"
 
 #include <QByteArrayView>
 
@@ -10,7 +11,7 @@ namespace core {
 /// member order. It refuses invalid UTF-8, nesting deeper than the limit and trailing
 /// content, so hostile input ends in an error with a position instead of exhausting the
 /// stack or memory.
-class JsonReader {
+class LUDMOX_EXPORT JsonReader {
 public:
     struct Failure {
         TextPosition position;

@@ -1,6 +1,7 @@
 #pragma once
 
 #include "core/jsonnode.h"
+#include "core/ludmoxexport.h"
 
 #include <QByteArray>
 
@@ -12,7 +13,7 @@ namespace core {
 /// fraction or exponent ("2.0"), so a reader tells them apart again; non-finite numbers,
 /// which JSON cannot hold, are written as null. Strings go out as UTF-8 with the escapes
 /// JSON requires; lone surrogates, which UTF-8 cannot carry, as \u escapes.
-class JsonWriter {
+class LUDMOX_EXPORT JsonWriter {
 public:
     enum class Style {
         Compact, // one line, no spaces: protocol messages

@@ -1,5 +1,7 @@
 #pragma once
 
+#include "core/ludmoxexport.h"
+
 #include <QString>
 #include <memory>
 
@@ -8,7 +10,7 @@ namespace core {
 /// Base of every object a Variant can hold: the component's public classes, the runtime's
 /// objects and the platform objects handed to hosts. Objects are shared through
 /// std::shared_ptr; a non-owning reference is a std::weak_ptr.
-class Object : public std::enable_shared_from_this<Object> {
+class LUDMOX_EXPORT Object : public std::enable_shared_from_this<Object> {
 public:
     virtual ~Object() = default;
 

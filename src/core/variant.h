@@ -1,5 +1,6 @@
 #pragma once
 
+#include "core/ludmoxexport.h"
 #include "core/object.h"
 
 #include <QDateTime>
@@ -15,7 +16,7 @@ namespace core {
 class VariantArray;
 
 /// Fixed-point currency: the value times 10,000, as the automation currency type.
-struct Currency {
+struct LUDMOX_EXPORT Currency {
     int64_t scaled = 0;
     friend bool operator==(Currency, Currency) = default;
 };
@@ -40,7 +41,7 @@ enum class VariantType : int16_t {
 };
 
 /// Whether values of the type are numbers: Byte, Integer, Long, Single, Double, Currency.
-bool isNumberType(VariantType type);
+LUDMOX_EXPORT bool isNumberType(VariantType type);
 
 /// An automation value with the Basic conversion rules.
 ///
@@ -51,7 +52,7 @@ bool isNumberType(VariantType type);
 /// user's locale); the invariant forms are for text that goes into formulas and SQL.
 ///
 /// Arrays have value semantics (copying a Variant copies the array, copy-on-write).
-class Variant {
+class LUDMOX_EXPORT Variant {
 public:
     Variant() = default; // Empty
     Variant(bool value);
@@ -124,7 +125,7 @@ public:
 
     /// Equality as Basic's "=" for two non-Null scalars (text compared binary); arrays and
     /// objects compare by identity/content for tests.
-    friend bool operator==(const Variant& a, const Variant& b);
+    friend LUDMOX_EXPORT bool operator==(const Variant& a, const Variant& b);
 
 private:
     VariantType m_type = VariantType::Empty;
@@ -147,7 +148,7 @@ void PrintTo(const Variant& value, std::ostream* out);
 
 /// A Basic array of Variants with any lower bound per dimension, one or more dimensions.
 /// Elements are stored with the first index varying fastest (column-major, as SAFEARRAY).
-class VariantArray {
+class LUDMOX_EXPORT VariantArray {
 public:
     struct Bound {
         int32_t lower = 0;

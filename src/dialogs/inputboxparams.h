@@ -1,5 +1,6 @@
 #pragma once
 
+#include "core/ludmoxexport.h"
 #include "core/object.h"
 #include "core/variant.h"
 #include "dialogs/inputboxparamsitem.h"
@@ -16,7 +17,7 @@ namespace dialogs {
 ///
 /// Keys are compared without regard to case and occur at most once. Every option starts
 /// at its zero value (False, 0, Empty).
-class InputBoxParams : public core::Object {
+class LUDMOX_EXPORT InputBoxParams : public core::Object {
 public:
     using ItemPtr = std::shared_ptr<InputBoxParamsItem>;
 

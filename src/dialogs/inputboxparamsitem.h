@@ -1,5 +1,6 @@
 #pragma once
 
+#include "core/ludmoxexport.h"
 #include "core/object.h"
 #include "core/variant.h"
 
@@ -13,7 +14,7 @@ namespace dialogs {
 ///
 /// The dialog writes only `Index` (when it is built), `Value` and, for multi-selection
 /// lists, `SelectionCount` (after OK). Every field starts at False / 0 / "" / Empty.
-class InputBoxParamsItem : public core::Object {
+class LUDMOX_EXPORT InputBoxParamsItem : public core::Object {
 public:
     QString className() const override { return QStringLiteral("InputBoxParamsItem"); }
 

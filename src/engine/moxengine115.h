@@ -1,5 +1,6 @@
 #pragma once
 
+#include "core/ludmoxexport.h"
 #include "core/object.h"
 #include "core/variant.h"
 #include "engine/moxservertypes.h"
@@ -28,7 +29,7 @@ namespace engine {
 /// Creation and destruction update the process-wide state of MoxGlobals: destroying any
 /// engine drops the shared runtime application object, so the other engines' next runtime
 /// use creates a fresh one. Destruction does not log off; a host calls Logoff first.
-class MoxEngine115 : public core::Object {
+class LUDMOX_EXPORT MoxEngine115 : public core::Object {
 public:
     MoxEngine115();
     ~MoxEngine115() override;

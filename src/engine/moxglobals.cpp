@@ -1,6 +1,7 @@
 #include "engine/moxglobals.h"
 
 #include "core/text.h"
+#include "platform/sitesettings.h"
 #include "platform/tempfolder.h"
 #include "runtime/application.h"
 #include "runtime/applicationfactory.h"
@@ -37,7 +38,10 @@ void ReleaseApplication()
 
 void TraceWrite(const QString& message, const QString& file, bool enabled)
 {
-    if (!enabled)
+    // Read once: a site switches tracing on for a whole run, and the trace points are many.
+    static const bool siteTrace
+        = platform::SiteSettings().isOn(platform::SiteSettings::Setting::Trace);
+    if (!enabled && !siteTrace)
         return;
     try {
         // The general date format: the user's short date with a four-digit year, then the

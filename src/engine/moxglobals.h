@@ -42,7 +42,9 @@ std::shared_ptr<runtime::Application> GetApplication();
 void ReleaseApplication();
 
 /// Appends "<date and time> <message>" and CR LF to `file` (DefaultTraceFile() when empty).
-/// Does nothing when `enabled` is false; a file that cannot be written loses the line.
+/// Does nothing when `enabled` is false, unless the site switched tracing on (the Trace
+/// setting, platform::SiteSettings, read once per process); a file that cannot be written
+/// loses the line.
 void TraceWrite(const QString& message, const QString& file, bool enabled);
 
 } // namespace engine

@@ -1,5 +1,6 @@
 #pragma once
 
+#include "core/ludmoxexport.h"
 #include "platform/printerinfo.h"
 #include "platform/printsettings.h"
 
@@ -14,7 +15,7 @@ class PrinterDevice;
 /// The process's current printer: the printer reports print on unless told otherwise, with
 /// its device settings. It starts as the default printer (Printers::defaultPrinter) with
 /// that printer's default settings; every caller in the process shares it.
-class CurrentPrinter {
+class LUDMOX_EXPORT CurrentPrinter {
 public:
     static CurrentPrinter& instance();
 

@@ -1,5 +1,7 @@
 #pragma once
 
+#include "core/ludmoxexport.h"
+
 #include <QString>
 #include <cstdint>
 #include <memory>
@@ -10,7 +12,7 @@ namespace platform {
 /// The common pickers the component's dialogs open from their browse buttons: colour,
 /// file-open and folder. The process has one active service: Qt's dialogs unless a test or a
 /// host installs another. Every picker returns nothing when the user cancels it.
-class DialogService {
+class LUDMOX_EXPORT DialogService {
 public:
     /// File-open flag: the chosen file must exist.
     static constexpr int32_t FileMustExist = 0x1000;

@@ -1,5 +1,7 @@
 #pragma once
 
+#include "core/ludmoxexport.h"
+
 #include <optional>
 
 namespace platform {
@@ -7,7 +9,7 @@ namespace platform {
 /// Whether the windows the component shows reach someone who can answer them. A modal
 /// dialog shown where nobody can see it waits for ever: a server started without a display
 /// (ludmoxd runs offscreen then) must decide without asking instead.
-class Display {
+class LUDMOX_EXPORT Display {
 public:
     /// False without a QApplication, under the offscreen or minimal platform plugin, or when
     /// neither DISPLAY nor WAYLAND_DISPLAY is set; true otherwise, or as overridden.

@@ -1,5 +1,7 @@
 #pragma once
 
+#include "core/ludmoxexport.h"
+
 #include <QString>
 #include <cstdint>
 #include <memory>
@@ -8,7 +10,7 @@ namespace platform {
 
 /// Message boxes as Basic's MsgBox shows them. The process has one active service: Qt's
 /// message boxes unless a test or a host installs another.
-class MessageBoxService {
+class LUDMOX_EXPORT MessageBoxService {
 public:
     /// Button sets (the low four bits of `buttons`).
     enum Buttons : int32_t {
@@ -45,7 +47,7 @@ protected:
 };
 
 /// The message boxes of the desktop session: QMessageBox.
-class QtMessageBoxService : public MessageBoxService {
+class LUDMOX_EXPORT QtMessageBoxService : public MessageBoxService {
 public:
     int32_t showMessage(
         int32_t ownerWindow, const QString& text, int32_t buttons, const QString& title) override;

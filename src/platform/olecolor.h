@@ -1,5 +1,7 @@
 #pragma once
 
+#include "core/ludmoxexport.h"
+
 #include <QColor>
 #include <cstdint>
 
@@ -9,7 +11,7 @@ namespace platform {
 /// nn (5 window background, 8 window text, 15 button face, ...), taken from the
 /// application's palette. An invalid QColor for a system colour number that has no meaning
 /// and for any other high byte.
-QColor colorFromOle(int32_t oleColor);
+LUDMOX_EXPORT QColor colorFromOle(int32_t oleColor);
 
 /// The OLE colour 0x00BBGGRR of color; alpha is dropped.
 int32_t oleFromColor(const QColor& color);

@@ -1,5 +1,6 @@
 #pragma once
 
+#include "core/ludmoxexport.h"
 #include "platform/printerinfo.h"
 #include "platform/printsettings.h"
 
@@ -11,7 +12,7 @@ namespace platform {
 
 /// Shows the system print dialog for the engine. The process has one active service: Qt's
 /// dialog unless a test or a host installs another.
-class PrintDialogService {
+class LUDMOX_EXPORT PrintDialogService {
 public:
     /// What the dialog is asked to show.
     struct Request {

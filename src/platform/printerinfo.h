@@ -1,11 +1,13 @@
 #pragma once
 
+#include "core/ludmoxexport.h"
+
 #include <QString>
 
 namespace platform {
 
 /// One installed printer as hosts see it: device name (its identity), driver name and port.
-class PrinterInfo {
+class LUDMOX_EXPORT PrinterInfo {
 public:
     PrinterInfo() = default;
     PrinterInfo(QString deviceName, QString driverName, QString port);

@@ -1,5 +1,7 @@
 #include "platform/printers.h"
 
+#include "platform/sitesettings.h"
+
 #include <QDir>
 #include <QLocale>
 #include <QPageSize>
@@ -44,11 +46,12 @@ QString Printers::virtualPdfDriverName()
 
 QString Printers::virtualPdfFolder()
 {
-    const QString configured = qEnvironmentVariable("LUDMOX_PDF_PRINTER_DIR");
+    const QString configured = SiteSettings().value(SiteSettings::Setting::PdfPrinterFolder);
     if (!configured.isEmpty())
         return QDir::cleanPath(QDir(configured).absolutePath());
+    // Not the application's data folder: the output would move with the host program's name.
     return QDir::cleanPath(
-        QStandardPaths::writableLocation(QStandardPaths::AppDataLocation) + u"/LUD Mox PDF"_s);
+        QStandardPaths::writableLocation(QStandardPaths::GenericDataLocation) + u"/ludmox/pdf"_s);
 }
 
 PrinterInfo Printers::virtualPdfPrinter()
@@ -74,7 +77,7 @@ QList<PrinterInfo> Printers::configuredPdfPrinters()
     // "Device Name=folder" entries separated by ";". Malformed entries and entries that
     // would shadow another printer's name are skipped.
     QList<PrinterInfo> printers;
-    const QString configured = qEnvironmentVariable("LUDMOX_PDF_PRINTERS");
+    const QString configured = SiteSettings().value(SiteSettings::Setting::PdfPrinters);
     for (const QString& entry : configured.split(u';', Qt::SkipEmptyParts)) {
         const qsizetype separator = entry.indexOf(u'=');
         if (separator <= 0)

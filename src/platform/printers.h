@@ -1,5 +1,6 @@
 #pragma once
 
+#include "core/ludmoxexport.h"
 #include "platform/printerinfo.h"
 #include "platform/printsettings.h"
 
@@ -12,7 +13,7 @@ namespace platform {
 /// The installed printers: the system's print queues (CUPS) followed by the component's own
 /// PDF printer, which is always there. The PDF printer writes one PDF file per print job into
 /// its folder; its port is that folder.
-class Printers {
+class LUDMOX_EXPORT Printers {
 public:
     /// "LUD Mox PDF"
     static QString virtualPdfDeviceName();

@@ -1,5 +1,7 @@
 #pragma once
 
+#include "core/ludmoxexport.h"
+
 #include <cstdint>
 
 class QPrinter;
@@ -23,7 +25,7 @@ namespace platform {
 ///
 /// Setters raise ComError 380 (Invalid property value) for a code outside these sets and then
 /// leave the setting as it was.
-class PrintSettings {
+class LUDMOX_EXPORT PrintSettings {
 public:
     int16_t colorMode() const { return m_colorMode; }
     int16_t copies() const { return m_copies; }

@@ -1,6 +1,7 @@
 #include "platform/settingsstore.h"
 
 #include "platform/platformglobal_p.h"
+#include "platform/sitesettings.h"
 
 #include <QDir>
 #include <QFileInfo>
@@ -30,15 +31,6 @@ QString encodeName(const QString& name)
             encoded += ch;
     }
     return encoded;
-}
-
-QString fileNameFor(const QString& application)
-{
-    QString name = encodeName(application);
-    // A leading dot would hide the file or, as "..", leave the folder.
-    if (name.startsWith(u'.'))
-        name = u"%2E"_s + name.mid(1);
-    return name + u".ini"_s;
 }
 
 // The stored name that matches wanted without regard to case, preferring an exact match.
@@ -71,6 +63,14 @@ void syncOrRaise(QSettings& settings)
     }
 }
 
+// Enters the application's group, then the section's, matching stored names without
+// regard to case.
+void enterSection(QSettings& settings, const QString& application, const QString& section)
+{
+    settings.beginGroup(storedName(settings.childGroups(), encodeName(application)));
+    settings.beginGroup(storedName(settings.childGroups(), encodeName(section)));
+}
+
 QString valueText(const QVariant& value)
 {
     // A hand-edited line "key=a, b" reads as a list; give it back as it was written.
@@ -82,16 +82,16 @@ QString valueText(const QVariant& value)
 } // namespace
 
 SettingsStore::SettingsStore()
-    : SettingsStore(QStandardPaths::writableLocation(QStandardPaths::GenericConfigLocation))
+    : m_files(SiteSettings::defaultFiles())
 { }
 
 SettingsStore::SettingsStore(const QString& baseFolder)
-    : m_baseFolder(QDir::cleanPath(baseFolder) + u"/LUD Mox"_s)
+    : m_files { QDir::cleanPath(baseFolder) + u"/ludmox/ludmox.conf"_s }
 { }
 
-QString SettingsStore::filePath(const QString& application) const
+QString SettingsStore::filePath() const
 {
-    return m_baseFolder + u'/' + fileNameFor(application);
+    return m_files.value(0);
 }
 
 std::optional<QString> SettingsStore::getSetting(
@@ -99,16 +99,17 @@ std::optional<QString> SettingsStore::getSetting(
 {
     if (application.isEmpty() || section.isEmpty() || key.isEmpty())
         return std::nullopt;
-    const QString path = filePath(application);
-    if (!QFileInfo::exists(path))
-        return std::nullopt;
-
-    QSettings settings(path, QSettings::IniFormat);
-    settings.beginGroup(storedName(settings.childGroups(), encodeName(section)));
-    const QString storedKey = storedName(settings.childKeys(), encodeName(key));
-    if (!settings.contains(storedKey))
-        return std::nullopt;
-    return valueText(settings.value(storedKey));
+    // The user's file first, then the system's under it.
+    for (const QString& path : m_files) {
+        if (!QFileInfo(path).isFile())
+            continue;
+        QSettings settings(path, QSettings::IniFormat);
+        enterSection(settings, application, section);
+        const QString storedKey = storedName(settings.childKeys(), encodeName(key));
+        if (settings.contains(storedKey))
+            return valueText(settings.value(storedKey));
+    }
+    return std::nullopt;
 }
 
 QString SettingsStore::getSetting(const QString& application, const QString& section,
@@ -123,31 +124,34 @@ void SettingsStore::saveSetting(
     requireName(application, u"application"_s);
     requireName(section, u"section"_s);
     requireName(key, u"key"_s);
-    if (!QDir().mkpath(m_baseFolder)) {
+    const QString folder = QFileInfo(filePath()).absolutePath();
+    if (!QDir().mkpath(folder)) {
         detail::raise(detail::PlatformError::PathFileAccess,
-            u"Path/File access error: the settings folder %1 cannot be created"_s.arg(
-                m_baseFolder));
+            u"Path/File access error: the settings folder %1 cannot be created"_s.arg(folder));
     }
 
-    QSettings settings(filePath(application), QSettings::IniFormat);
-    settings.beginGroup(storedName(settings.childGroups(), encodeName(section)));
+    QSettings settings(filePath(), QSettings::IniFormat);
+    enterSection(settings, application, section);
     settings.setValue(storedName(settings.childKeys(), encodeName(key)), value);
+    settings.endGroup();
     settings.endGroup();
     syncOrRaise(settings);
 }
 
 bool SettingsStore::deleteSetting(const QString& application, const QString& section)
 {
-    const QString path = filePath(application);
+    const QString path = filePath();
     if (application.isEmpty() || section.isEmpty() || !QFileInfo::exists(path))
         return false;
 
     QSettings settings(path, QSettings::IniFormat);
+    settings.beginGroup(storedName(settings.childGroups(), encodeName(application)));
     const QStringList sections = settings.childGroups();
     const QString stored = storedName(sections, encodeName(section));
     if (!sections.contains(stored))
         return false;
     settings.remove(stored);
+    settings.endGroup();
     syncOrRaise(settings);
     return true;
 }
@@ -155,17 +159,18 @@ bool SettingsStore::deleteSetting(const QString& application, const QString& sec
 bool SettingsStore::deleteSetting(
     const QString& application, const QString& section, const QString& key)
 {
-    const QString path = filePath(application);
+    const QString path = filePath();
     if (application.isEmpty() || section.isEmpty() || key.isEmpty() || !QFileInfo::exists(path))
         return false;
 
     QSettings settings(path, QSettings::IniFormat);
-    settings.beginGroup(storedName(settings.childGroups(), encodeName(section)));
+    enterSection(settings, application, section);
     const QStringList keys = settings.childKeys();
     const QString stored = storedName(keys, encodeName(key));
     if (!keys.contains(stored))
         return false;
     settings.remove(stored);
+    settings.endGroup();
     settings.endGroup();
     syncOrRaise(settings);
     return true;

@@ -1,23 +1,28 @@
 #pragma once
 
+#include "core/ludmoxexport.h"
+
 #include <QString>
+#include <QStringList>
 #include <optional>
 
 namespace platform {
 
 /// Per-user application settings, three levels deep (application, section, key), every value
-/// a string. Each application is one INI file, "<base>/LUD Mox/<application>.ini", where the
-/// base is the user's generic configuration folder unless the store is given another.
+/// a string. They share the site settings' INI file (platform::SiteSettings), under a group
+/// per application: "$XDG_CONFIG_HOME/ludmox/ludmox.conf", with the system's files of the
+/// same name read under it; a store given a base folder uses "<base>/ludmox/ludmox.conf"
+/// alone. Changes go to the user's file.
 ///
 /// Section and key names are matched without regard to case, as the settings stores hosts
 /// know from other systems do; a value saved under "top" replaces one stored as "Top".
 /// Every change is written at once and atomically (a new file replaces the old one), so a
 /// crash never leaves a half-written file behind.
-class SettingsStore {
+class LUDMOX_EXPORT SettingsStore {
 public:
-    /// The store in the user's generic configuration folder (QStandardPaths).
+    /// The store in the user's configuration folder, over the system's.
     SettingsStore();
-    /// A store whose files live under baseFolder instead.
+    /// A store whose only file lives under baseFolder instead.
     explicit SettingsStore(const QString& baseFolder);
 
     /// The stored value; defaultValue when the application, section or key is not there.
@@ -38,11 +43,11 @@ public:
     /// Removes one key; returns whether there was one.
     bool deleteSetting(const QString& application, const QString& section, const QString& key);
 
-    /// The INI file of an application.
-    QString filePath(const QString& application) const;
+    /// The file changes are written to.
+    QString filePath() const;
 
 private:
-    QString m_baseFolder;
+    QStringList m_files;
 };
 
 } // namespace platform

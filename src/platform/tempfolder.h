@@ -1,5 +1,7 @@
 #pragma once
 
+#include "core/ludmoxexport.h"
+
 #include <QString>
 
 namespace platform {
@@ -13,7 +15,7 @@ namespace platform {
 /// (a symbolic link, a file, a directory of another user) it is left alone and a fresh
 /// private folder with a random suffix is used instead; a folder of the user's own with a
 /// wider mode is narrowed to 0700.
-class TempFolder {
+class LUDMOX_EXPORT TempFolder {
 public:
     /// baseDirectory empty: the system temporary directory (QDir::tempPath()).
     explicit TempFolder(const QString& baseDirectory = QString());

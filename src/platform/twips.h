@@ -1,5 +1,7 @@
 #pragma once
 
+#include "core/ludmoxexport.h"
+
 #include <QtGlobal>
 
 class QPaintDevice;
@@ -8,11 +10,11 @@ namespace platform {
 
 /// Twips per pixel at a logical resolution: 1440 / dpi, so 15 at 96 DPI. A resolution that
 /// is not positive counts as 96 DPI.
-qreal twipsPerPixel(qreal logicalDpi);
+LUDMOX_EXPORT qreal twipsPerPixel(qreal logicalDpi);
 
 /// Twips per pixel across and down on device (a widget, an image), or on the primary screen
 /// when device is null; 15 when there is no screen.
-qreal twipsPerPixelX(const QPaintDevice* device = nullptr);
-qreal twipsPerPixelY(const QPaintDevice* device = nullptr);
+LUDMOX_EXPORT qreal twipsPerPixelX(const QPaintDevice* device = nullptr);
+LUDMOX_EXPORT qreal twipsPerPixelY(const QPaintDevice* device = nullptr);
 
 } // namespace platform

@@ -1,5 +1,7 @@
 #pragma once
 
+#include "core/ludmoxexport.h"
+
 #include <cstdint>
 
 class QWidget;
@@ -9,7 +11,7 @@ namespace platform {
 
 /// Native window handles as hosts pass them: 32-bit Long values of the windowing system's
 /// window id (WId). X11 ids fit; ids of other systems are cut to their low 32 bits.
-class WindowHandles {
+class LUDMOX_EXPORT WindowHandles {
 public:
     /// The handle of the top-level window that shows widget, creating its native window when
     /// needed; 0 for null.

@@ -1,6 +1,7 @@
 #pragma once
 
 #include "core/eventsource.h"
+#include "core/ludmoxexport.h"
 #include "core/object.h"
 #include "core/variant.h"
 
@@ -13,7 +14,7 @@ namespace reports {
 /// the same role to every connected handler, in connection order, and returns what the
 /// handlers left in the by-reference arguments. With no handler connected the arguments come
 /// back unchanged. An error a handler raises reaches the caller.
-class MoxEvents115 : public core::Object, public core::EventSource {
+class LUDMOX_EXPORT MoxEvents115 : public core::Object, public core::EventSource {
 public:
     /// Dispatch ids of the outgoing interface.
     enum EventId : int32_t {

@@ -1,5 +1,6 @@
 #pragma once
 
+#include "core/ludmoxexport.h"
 #include "core/object.h"
 #include "core/variant.h"
 
@@ -41,7 +42,7 @@ struct SectionBinding;
 /// Members that report through a Boolean result never raise; CheckOLEDB, C_Report,
 /// CheckEditedSelection, SetParameters, GetParamsCollection and GetParamsDictionary pass
 /// the runtime's errors on to the caller.
-class MoxReport115 : public core::Object {
+class LUDMOX_EXPORT MoxReport115 : public core::Object {
 public:
     MoxReport115();
     ~MoxReport115() override;

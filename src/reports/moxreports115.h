@@ -1,5 +1,6 @@
 #pragma once
 
+#include "core/ludmoxexport.h"
 #include "core/object.h"
 
 #include <QString>
@@ -21,7 +22,7 @@ class MoxReport115;
 /// without owning it. Report names are compared without regard to case and enumerate in the
 /// order they were added. The collection must be owned by a std::shared_ptr, which is how
 /// its reports find it again.
-class MoxReports115 : public core::Object {
+class LUDMOX_EXPORT MoxReports115 : public core::Object {
 public:
     MoxReports115();
     ~MoxReports115() override;

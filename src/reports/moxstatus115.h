@@ -1,5 +1,6 @@
 #pragma once
 
+#include "core/ludmoxexport.h"
 #include "core/object.h"
 #include "reports/enuprintprogress.h"
 
@@ -9,7 +10,7 @@ namespace reports {
 
 /// A snapshot of a report's print progress, returned by the report's Status property. A
 /// plain record: the report fills it, hosts read and may overwrite every field.
-class MoxStatus115 : public core::Object {
+class LUDMOX_EXPORT MoxStatus115 : public core::Object {
 public:
     QString className() const override { return QStringLiteral("MoxStatus115"); }
 

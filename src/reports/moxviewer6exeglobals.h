@@ -1,5 +1,7 @@
 #pragma once
 
+#include "core/ludmoxexport.h"
+
 // The parameter dialog of the reports: built from a report's parameter fields, shown, and
 // its answers written back as the parameters' current values.
 
@@ -51,6 +53,6 @@ using InputBoxPresenter = std::function<bool(const std::shared_ptr<dialogs::Inpu
 
 /// Replaces what shows the dialog (tests answer it without a window); null restores the
 /// input dialog. Returns the previous presenter.
-InputBoxPresenter SetInputBoxPresenter(InputBoxPresenter presenter);
+LUDMOX_EXPORT InputBoxPresenter SetInputBoxPresenter(InputBoxPresenter presenter);
 
 } // namespace reports

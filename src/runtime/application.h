@@ -1,5 +1,6 @@
 #pragma once
 
+#include "core/ludmoxexport.h"
 #include "core/object.h"
 
 #include <QString>
@@ -11,7 +12,7 @@ class Report;
 
 /// The report runtime's application object: one per process. Every failure is raised as
 /// core::ComError with the runtime's number.
-class Application : public core::Object {
+class LUDMOX_EXPORT Application : public core::Object {
 public:
     QString className() const override { return QStringLiteral("Application"); }
 

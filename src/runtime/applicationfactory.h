@@ -1,5 +1,7 @@
 #pragma once
 
+#include "core/ludmoxexport.h"
+
 #include <functional>
 #include <memory>
 
@@ -9,7 +11,7 @@ class Application;
 
 /// The process-wide factory that creates the runtime application object. The report runtime
 /// installs itself as the default; tests install a fake.
-class ApplicationFactory {
+class LUDMOX_EXPORT ApplicationFactory {
 public:
     using Function = std::function<std::shared_ptr<Application>()>;
 

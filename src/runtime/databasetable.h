@@ -1,5 +1,6 @@
 #pragma once
 
+#include "core/ludmoxexport.h"
 #include "core/object.h"
 #include "core/variant.h"
 
@@ -11,7 +12,7 @@ namespace runtime {
 
 /// One table of a report's database: a database table, a view, a stored procedure ("name;1")
 /// or an SQL command (location "Command").
-class DatabaseTable : public core::Object {
+class LUDMOX_EXPORT DatabaseTable : public core::Object {
 public:
     QString className() const override { return QStringLiteral("DatabaseTable"); }
 

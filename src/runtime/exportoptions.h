@@ -1,5 +1,6 @@
 #pragma once
 
+#include "core/ludmoxexport.h"
 #include "core/object.h"
 
 #include <QString>
@@ -8,7 +9,7 @@ namespace runtime {
 
 /// Where and how Report::exportReport writes. Format codes: 31 PDF, 38 Excel (XLSX),
 /// 32 HTML; destination codes: 1 disk file, 2 mail.
-class ExportOptions : public core::Object {
+class LUDMOX_EXPORT ExportOptions : public core::Object {
 public:
     QString className() const override { return QStringLiteral("ExportOptions"); }
 

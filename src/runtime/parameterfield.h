@@ -1,5 +1,6 @@
 #pragma once
 
+#include "core/ludmoxexport.h"
 #include "core/object.h"
 #include "core/variant.h"
 
@@ -10,7 +11,7 @@ namespace runtime {
 /// A parameter field of a report. Value type codes: 1..16 (byte, integer, long, number,
 /// currency, Boolean, date, time, text, other, date-time; see the report format docs).
 /// Indices of current and default values are 1-based.
-class ParameterField : public core::Object {
+class LUDMOX_EXPORT ParameterField : public core::Object {
 public:
     QString className() const override { return QStringLiteral("ParameterFieldDefinition"); }
 

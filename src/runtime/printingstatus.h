@@ -1,5 +1,6 @@
 #pragma once
 
+#include "core/ludmoxexport.h"
 #include "runtime/printingprogress.h"
 
 #include <cstdint>
@@ -7,7 +8,7 @@
 namespace runtime {
 
 /// The report's printing status.
-struct PrintingStatus {
+struct LUDMOX_EXPORT PrintingStatus {
     int32_t recordsRead = 0;
     int32_t recordsSelected = 0;
     int32_t recordsPrinted = 0;

@@ -1,5 +1,6 @@
 #pragma once
 
+#include "core/ludmoxexport.h"
 #include "core/object.h"
 #include "runtime/printingstatus.h"
 
@@ -24,7 +25,7 @@ struct PageRange {
 
 /// An opened report (or subreport) of the runtime. Every failure is raised as
 /// core::ComError with the runtime's number.
-class Report : public core::Object {
+class LUDMOX_EXPORT Report : public core::Object {
 public:
     using NoDataHandler = std::function<void(bool& cancel)>;
 

@@ -1,5 +1,6 @@
 #pragma once
 
+#include "core/ludmoxexport.h"
 #include "core/object.h"
 #include "core/variant.h"
 
@@ -14,7 +15,7 @@ class Section;
 
 /// A report object placed in a section. Members that an object's kind does not have raise
 /// ComError 438 ("Object doesn't support this property or method"), as late binding would.
-class ReportObject : public core::Object {
+class LUDMOX_EXPORT ReportObject : public core::Object {
 public:
     QString className() const override { return typeName(); }
 

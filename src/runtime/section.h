@@ -1,5 +1,6 @@
 #pragma once
 
+#include "core/ludmoxexport.h"
 #include "core/object.h"
 
 #include <QString>
@@ -14,7 +15,7 @@ class ReportObject;
 /// A section of a report ("PH", "D", "GH1"...). Its format event is raised for every
 /// instance of the section before the instance is placed on the page; handlers may change
 /// the section's objects.
-class Section : public core::Object {
+class LUDMOX_EXPORT Section : public core::Object {
 public:
     using FormatHandler = std::function<void()>;
 

@@ -302,22 +302,24 @@ struct SettingsCase {
 
 class SettingsSources : public testing::TestWithParam<SettingsCase> { };
 
-TEST_P(SettingsSources, EnvironmentWinsOverTheStore)
+TEST_P(SettingsSources, EnvironmentWinsOverTheFile)
 {
     const SettingsCase& c = GetParam();
     QTemporaryDir dir;
-    platform::SettingsStore store(dir.path());
+    const QString file = dir.filePath(u"ludmox.conf"_s);
+    QSettings stored(file, QSettings::IniFormat);
     const QStringList keys { u"Url"_s, u"User"_s, u"Password"_s, u"From"_s, u"Timeout"_s };
     const QStringList variables { u"LUDMOX_SMTP_URL"_s, u"LUDMOX_SMTP_USER"_s,
         u"LUDMOX_SMTP_PASSWORD"_s, u"LUDMOX_SMTP_FROM"_s, u"LUDMOX_SMTP_TIMEOUT"_s };
     QProcessEnvironment environment;
     for (int i = 0; i < keys.size(); ++i) {
         if (!c.stored.value(i).isEmpty())
-            store.saveSetting(u"Orvel LUD 6.0"_s, u"Mail"_s, keys.at(i), c.stored.at(i));
+            stored.setValue(u"Mail/"_s + keys.at(i), c.stored.at(i));
         if (i < c.environment.size())
             environment.insert(variables.at(i), c.environment.at(i));
     }
-    const MailSettings settings = MailSettings::load(store, environment);
+    stored.sync();
+    const MailSettings settings = MailSettings::load(platform::SiteSettings(environment, { file }));
     EXPECT_EQ(QStringList({ settings.url, settings.user, settings.password, settings.from,
                   QString::number(settings.timeoutSeconds),
                   QString::number(settings.connectTimeoutSeconds) }),

@@ -1,3 +1,4 @@
+#include <QCoreApplication>
 #include <QDir>
 #include <QFile>
 #include <QPainter>
@@ -415,3 +416,19 @@ TEST_F(CurrentPrinterTest, DevicePrintsWithTheCurrentSettings)
 }
 
 } // namespace
+
+TEST(PdfPrinterFolder, DoesNotMoveWithTheHostProgramsName)
+{
+    const QByteArray previous = qgetenv("LUDMOX_PDF_PRINTER_DIR");
+    qunsetenv("LUDMOX_PDF_PRINTER_DIR");
+    const QString name = QCoreApplication::applicationName();
+    QCoreApplication::setApplicationName(u"first-host"_s);
+    const QString first = Printers::virtualPdfFolder();
+    QCoreApplication::setApplicationName(u"second host"_s);
+    const QString second = Printers::virtualPdfFolder();
+    QCoreApplication::setApplicationName(name);
+    if (!previous.isNull())
+        qputenv("LUDMOX_PDF_PRINTER_DIR", previous);
+    EXPECT_EQ(first, second);
+    EXPECT_TRUE(first.endsWith(u"/ludmox/pdf"_s)) << first.toStdString();
+}

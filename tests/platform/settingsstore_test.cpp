@@ -5,6 +5,7 @@
 #include <core/comerror.h>
 #include <gtest/gtest.h>
 #include <platform/settingsstore.h>
+#include <platform/sitesettings.h>
 
 using namespace Qt::StringLiterals;
 
@@ -121,20 +122,21 @@ TEST_F(SettingsStoreTest, DeleteRemovesOnlyWhatItNames)
     EXPECT_FALSE(store.deleteSetting(u"Never saved"_s, u"S1"_s));
 }
 
-TEST_F(SettingsStoreTest, ApplicationsHaveTheirOwnFilesInsideTheBase)
+TEST_F(SettingsStoreTest, ApplicationsShareOneFileAndStayApart)
 {
-    const QString apps[] = { app, u"../../escape"_s, u"a/b"_s, u".hidden"_s };
+    const QString apps[] = { app, u"../../escape"_s, u"a/b"_s, u".hidden"_s, u"Mail"_s };
     for (const QString& application : apps)
         store.saveSetting(application, u"S"_s, u"k"_s, application);
 
     for (const QString& application : apps) {
         SCOPED_TRACE(application.toStdString());
         EXPECT_EQ(store.getSetting(application, u"S"_s, u"k"_s), application);
-        const QFileInfo file(store.filePath(application));
-        EXPECT_TRUE(file.exists());
-        EXPECT_EQ(file.absolutePath(), QDir(base.path()).absoluteFilePath(u"LUD Mox"_s));
-        EXPECT_FALSE(file.fileName().startsWith(u'.'));
     }
+    EXPECT_EQ(store.filePath(), QDir(base.path()).absoluteFilePath(u"ludmox/ludmox.conf"_s));
+    EXPECT_EQ(QDir(base.path() + u"/ludmox"_s).entryList(QDir::Files), QStringList { u"ludmox.conf"_s });
+    // An application named like a site section does not become the site's mail settings.
+    const platform::SiteSettings site({}, { store.filePath() });
+    EXPECT_EQ(site.value(platform::SiteSettings::Setting::SmtpUrl), QString());
 }
 
 TEST_F(SettingsStoreTest, EmptyNamesAreRefused)

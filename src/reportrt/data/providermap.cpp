@@ -1,5 +1,7 @@
 #include "reportrt/data/providermap.h"
 
+#include "platform/sitesettings.h"
+
 #include "reportrt/base/runtimeerror.h"
 
 #include <QCryptographicHash>
@@ -250,7 +252,7 @@ QString ProviderMap::serverDriver()
 {
     QString driver = settings().serverDriver;
     if (driver.isEmpty())
-        driver = qEnvironmentVariable("LUDMOX_SERVER_DRIVER");
+        driver = platform::SiteSettings().value(platform::SiteSettings::Setting::ServerDriver);
     driver = driver.trimmed().toUpper();
     return driver == u"QPSQL" ? driver : QStringLiteral("QODBC");
 }
@@ -264,9 +266,9 @@ QString ProviderMap::odbcDriver()
 {
     if (!settings().odbcDriver.isEmpty())
         return settings().odbcDriver;
-    const QString fromEnvironment = qEnvironmentVariable("LUDMOX_ODBC_DRIVER");
-    return fromEnvironment.isEmpty() ? QStringLiteral("ODBC Driver 18 for SQL Server")
-                                     : fromEnvironment;
+    const QString fromSite
+        = platform::SiteSettings().value(platform::SiteSettings::Setting::OdbcDriver);
+    return fromSite.isEmpty() ? QStringLiteral("ODBC Driver 18 for SQL Server") : fromSite;
 }
 
 void ProviderMap::addLogon(const ConnectionSpec& spec)

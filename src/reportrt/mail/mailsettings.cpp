@@ -1,44 +1,19 @@
 #include "reportrt/mail/mailsettings.h"
 
-#include "platform/settingsstore.h"
+#include "platform/sitesettings.h"
 
 namespace reportrt::mail {
 
-namespace {
-
-const QString application = QStringLiteral("Orvel LUD 6.0");
-const QString section = QStringLiteral("Mail");
-
-QString value(const platform::SettingsStore& store, const QProcessEnvironment& environment,
-    const QString& key, const QString& variable)
+MailSettings MailSettings::load(const platform::SiteSettings& site)
 {
-    const QString fromEnvironment = environment.value(variable);
-    if (!fromEnvironment.isEmpty())
-        return fromEnvironment;
-    return store.getSetting(application, section, key, QString());
-}
-
-} // namespace
-
-MailSettings MailSettings::load(
-    const platform::SettingsStore& store, const QProcessEnvironment& environment)
-{
+    using Setting = platform::SiteSettings::Setting;
     MailSettings settings;
-    settings.url
-        = value(store, environment, QStringLiteral("Url"), QStringLiteral("LUDMOX_SMTP_URL"))
-              .trimmed();
-    settings.user
-        = value(store, environment, QStringLiteral("User"), QStringLiteral("LUDMOX_SMTP_USER"));
-    settings.password = value(
-        store, environment, QStringLiteral("Password"), QStringLiteral("LUDMOX_SMTP_PASSWORD"));
-    settings.from
-        = value(store, environment, QStringLiteral("From"), QStringLiteral("LUDMOX_SMTP_FROM"))
-              .trimmed();
+    settings.url = site.value(Setting::SmtpUrl);
+    settings.user = site.value(Setting::SmtpUser);
+    settings.password = site.value(Setting::SmtpPassword);
+    settings.from = site.value(Setting::SmtpFrom);
     bool ok = false;
-    const int timeout = value(
-        store, environment, QStringLiteral("Timeout"), QStringLiteral("LUDMOX_SMTP_TIMEOUT"))
-                            .trimmed()
-                            .toInt(&ok);
+    const int timeout = site.value(Setting::SmtpTimeout).toInt(&ok);
     if (ok && timeout > 0) {
         settings.timeoutSeconds = timeout;
         settings.connectTimeoutSeconds = std::min(settings.connectTimeoutSeconds, timeout);
@@ -48,7 +23,7 @@ MailSettings MailSettings::load(
 
 MailSettings MailSettings::load()
 {
-    return load(platform::SettingsStore());
+    return load(platform::SiteSettings());
 }
 
 } // namespace reportrt::mail

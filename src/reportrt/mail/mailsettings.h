@@ -1,18 +1,17 @@
 #pragma once
 
-#include <QProcessEnvironment>
 #include <QString>
 
 namespace platform {
-class SettingsStore;
+class SiteSettings;
 }
 
 namespace reportrt::mail {
 
-/// Where and how mail is delivered. Read from section "Mail" of the user's "Orvel LUD 6.0"
-/// settings (keys Url, User, Password, From, Timeout) with the environment taking precedence:
-/// LUDMOX_SMTP_URL, LUDMOX_SMTP_USER, LUDMOX_SMTP_PASSWORD, LUDMOX_SMTP_FROM,
-/// LUDMOX_SMTP_TIMEOUT. An empty URL means no server: messages go to the outbox.
+/// Where and how mail is delivered: the site settings of section "Mail" (keys Url, User,
+/// Password, From, Timeout; variables LUDMOX_SMTP_URL, LUDMOX_SMTP_USER,
+/// LUDMOX_SMTP_PASSWORD, LUDMOX_SMTP_FROM, LUDMOX_SMTP_TIMEOUT). An empty URL means no
+/// server: messages go to the outbox.
 class MailSettings {
 public:
     /// The server, "smtp://host[:port]" (STARTTLS when the server offers it) or
@@ -29,11 +28,10 @@ public:
 
     bool hasServer() const { return !url.trimmed().isEmpty(); }
 
-    /// The settings from store, each overridden by its environment variable when that is set
-    /// and not empty. A Timeout that is not a positive number of seconds keeps the default.
-    static MailSettings load(const platform::SettingsStore& store,
-        const QProcessEnvironment& environment = QProcessEnvironment::systemEnvironment());
-    /// load() from the user's own settings store.
+    /// The settings from site. A Timeout that is not a positive number of seconds keeps the
+    /// default.
+    static MailSettings load(const platform::SiteSettings& site);
+    /// load() from the process's site settings.
     static MailSettings load();
 };
 

@@ -1,5 +1,7 @@
 #include "reportrt/mail/outbox.h"
 
+#include "platform/sitesettings.h"
+
 #include "reportrt/mail/mailerror.h"
 #include "reportrt/mail/maillogging_p.h"
 
@@ -40,9 +42,10 @@ Outbox::Outbox(const QString& folder)
         QDir::cleanPath(QFileInfo(folder.isEmpty() ? defaultFolder() : folder).absoluteFilePath()))
 { }
 
-QString Outbox::defaultFolder(const QProcessEnvironment& environment)
+QString Outbox::defaultFolder()
 {
-    const QString overridden = environment.value(QStringLiteral("LUDMOX_OUTBOX"));
+    const QString overridden
+        = platform::SiteSettings().value(platform::SiteSettings::Setting::Outbox);
     if (!overridden.isEmpty())
         return overridden;
     const QString data = QStandardPaths::writableLocation(QStandardPaths::GenericDataLocation);
@@ -50,7 +53,8 @@ QString Outbox::defaultFolder(const QProcessEnvironment& environment)
     if (data.isEmpty())
         throw MailError(MailError::Kind::Outbox,
             QStringLiteral("No mail server is configured and there is no user data folder for "
-                           "the outbox; set LUDMOX_OUTBOX or the mail server."));
+                           "the outbox; set the outbox folder (LUDMOX_OUTBOX) or the mail "
+                           "server."));
     return data + QStringLiteral("/ludmox/outbox");
 }
 

@@ -1,7 +1,6 @@
 #pragma once
 
 #include <QByteArray>
-#include <QProcessEnvironment>
 #include <QString>
 
 namespace reportrt::mail {
@@ -13,11 +12,10 @@ public:
     /// folder empty: defaultFolder(), which may throw.
     explicit Outbox(const QString& folder = QString());
 
-    /// LUDMOX_OUTBOX when set, else "ludmox/outbox" in the user's generic data folder
-    /// (QStandardPaths::GenericDataLocation, usually ~/.local/share). Throws MailError
-    /// (Outbox) when there is no such folder.
-    static QString defaultFolder(
-        const QProcessEnvironment& environment = QProcessEnvironment::systemEnvironment());
+    /// The site's Outbox setting (LUDMOX_OUTBOX) when set, else "ludmox/outbox" in the user's
+    /// generic data folder (QStandardPaths::GenericDataLocation, usually ~/.local/share).
+    /// Throws MailError (Outbox) when there is no such folder.
+    static QString defaultFolder();
 
     QString folder() const { return m_folder; }
 

@@ -1,5 +1,7 @@
 #include "reportrt/output/allocatortuning_p.h"
 
+#include "platform/sitesettings.h"
+
 #include <QtGlobal>
 #include <mutex>
 
@@ -13,7 +15,7 @@ void tuneAllocatorForPdf()
 {
 #if defined(__GLIBC__)
     // The allocator belongs to the host process: only a site that asks for it gets it.
-    if (qEnvironmentVariableIntValue("LUDMOX_TUNE_ALLOCATOR") != 1)
+    if (!platform::SiteSettings().isOn(platform::SiteSettings::Setting::TuneAllocator))
         return;
     static std::once_flag once;
     std::call_once(once, [] {

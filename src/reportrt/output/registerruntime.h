@@ -1,10 +1,12 @@
 #pragma once
 
+#include "core/ludmoxexport.h"
+
 namespace reportrt {
 
 /// Registers the report runtime: installs it as the process's runtime application factory
 /// (one application object while any holder keeps it, and a new one after), and installs
 /// its printing and its writers in the writer table. Calling it again changes nothing.
-void registerRuntime();
+LUDMOX_EXPORT void registerRuntime();
 
 } // namespace reportrt

@@ -1,0 +1,20 @@
+#pragma once
+
+// Everything a host needs: the engine, its report collection and reports, their status and
+// events, the parameter dialog's model, the runtime's registration and the automation
+// server.
+
+#include "automation/server.h"
+#include "core/collection.h"
+#include "core/comerror.h"
+#include "core/dictionary.h"
+#include "core/variant.h"
+#include "dialogs/inputboxparams.h"
+#include "dialogs/inputboxparamsitem.h"
+#include "engine/moxengine115.h"
+#include "ludmox/version.h"
+#include "reportrt/output/registerruntime.h"
+#include "reports/moxevents115.h"
+#include "reports/moxreport115.h"
+#include "reports/moxreports115.h"
+#include "reports/moxstatus115.h"
