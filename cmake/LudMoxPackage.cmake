@@ -22,6 +22,8 @@ function(ludmox_add_shared_library target output export)
         list(APPEND objects $<TARGET_OBJECTS:${library}>)
     endforeach()
     add_library(${target} SHARED ${objects})
+    # The objects were moc-ed in their own libraries already.
+    set_target_properties(${target} PROPERTIES AUTOMOC OFF)
     add_library(LudMox::${export}Shared ALIAS ${target})
     set_target_properties(${target} PROPERTIES
         OUTPUT_NAME ${output} EXPORT_NAME ${export} LINKER_LANGUAGE CXX

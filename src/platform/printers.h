@@ -19,12 +19,14 @@ public:
     static QString virtualPdfDeviceName();
     /// "ludmox-pdf"
     static QString virtualPdfDriverName();
-    /// The PDF printer's folder: $LUDMOX_PDF_PRINTER_DIR when set, otherwise "LUD Mox PDF" in
-    /// the application's data folder. It is created when the first job is printed.
+    /// The PDF printer's folder: the site's PdfFolder setting (LUDMOX_PDF_PRINTER_DIR) when
+    /// set, otherwise "ludmox/pdf" in the user's data folder, whatever the host program is
+    /// called. It is created when the first job is printed.
     static QString virtualPdfFolder();
     static PrinterInfo virtualPdfPrinter();
 
-    /// Further PDF printers configured in $LUDMOX_PDF_PRINTERS ("Name=folder;Name2=folder2");
+    /// Further PDF printers of the site's PdfPrinters setting (LUDMOX_PDF_PRINTERS,
+    /// "Name=folder;Name2=folder2");
     /// each writes to its own folder like the built-in one.
     static QList<PrinterInfo> configuredPdfPrinters();
     /// Every installed printer: the system's, the PDF printer, then the configured PDF

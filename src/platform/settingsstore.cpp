@@ -6,7 +6,6 @@
 #include <QDir>
 #include <QFileInfo>
 #include <QSettings>
-#include <QStandardPaths>
 
 using namespace Qt::StringLiterals;
 
