@@ -1,31 +1,10 @@
-"""Host library for ludmoxd, the LUD Mox automation server.
+"""The host's end of the conversation with ludmoxd: the client, proxies and events.
 
 Starts ``ludmoxd`` and talks JSON-RPC 2.0 with it over its standard input and output.
-Objects of the component come back as proxies with attribute access by member name::
-
-    from ludmox_client import Client
-
-    with Client() as mox:                      # ludmoxd from $LUDMOX_LUDMOXD or the PATH
-        engine = mox.create("MoxEngine115")
-        engine.Init(3, True, 0, 0)
-        engine.SetLogonInfo(2, "server", "database", "user", "password")
-        report = engine.GetReports().Item("/reports/orders.rpt")
-        report.DefaultPrinter = "PDF"
-        print(report.Status.Progress)
-
-Reading an attribute reads a property or gives a callable method; assigning an attribute
-assigns the property. Values map as follows: ``None`` is Null, ``EMPTY`` is Empty,
-``NOTHING`` is an empty object reference, ``MISSING`` skips an optional argument,
-``decimal.Decimal`` is Currency, ``datetime.datetime`` is Date (local time), lists and
-tuples are zero-based arrays (``Array`` and ``Array2D`` carry other bounds).
-
-Errors of the component and of the call itself raise ``ComError`` with ``number``,
-``source`` and ``description``. Events reach handlers registered with ``Client.on``; a
-handler may change by-reference arguments through ``event.args`` and may call back into
-the component.
-
-Standard library only.
+Objects of the component come back as proxies with attribute access by member name.
 """
+
+from __future__ import annotations
 
 import datetime
 import decimal
@@ -33,131 +12,37 @@ import json
 import os
 import subprocess
 import weakref
+from typing import (
+    IO, Any, Callable, Dict, Iterator, List, Mapping, Optional, Sequence, Tuple, Union,
+)
 
-__all__ = [
-    "Array", "Array2D", "Client", "ComError", "EMPTY", "ErrorValue", "Event", "MISSING",
-    "NOTHING", "Proxy",
-]
+from .discovery import find_server
+from .errors import COMPONENT_ERROR, INVALID_PARAMS, METHOD_NOT_FOUND, ComError
+from .values import EMPTY, MISSING, NOTHING, Array, Array2D, ErrorValue
 
-# JSON-RPC error codes the server answers with.
-COMPONENT_ERROR = -32000
-INVALID_REQUEST = -32600
-METHOD_NOT_FOUND = -32601
-INVALID_PARAMS = -32602
-PARSE_ERROR = -32700
-
-
-class ComError(Exception):
-    """An error answer: the component's error (``code`` -32000) or a failed call.
-
-    ``number`` is the error number as a signed 32-bit value: the component's own number,
-    or the dispatch error number (0x80020003 member not found, 0x80020005 type mismatch,
-    0x8002000E bad parameter count, 0x8002000F parameter not optional) of a call that did
-    not reach the member, or the JSON-RPC code when neither applies.
-    """
-
-    def __init__(self, number, source, description, code=None, data=None):
-        super().__init__(number, source, description)
-        self.number = number
-        self.source = source
-        self.description = description
-        self.code = code
-        self.data = data
-
-    def __str__(self):
-        return f"{self.number}, {self.source}, {self.description}"
-
-
-class _Singleton:
-    def __init__(self, name):
-        self._name = name
-
-    def __repr__(self):
-        return self._name
-
-    def __bool__(self):
-        return False
-
-
-EMPTY = _Singleton("EMPTY")
-"""The Empty value (an uninitialised Variant)."""
-NOTHING = _Singleton("NOTHING")
-"""An object reference to no object."""
-MISSING = _Singleton("MISSING")
-"""An omitted optional argument; the member takes its declared default."""
-
-
-class ErrorValue:
-    """A Variant holding an error code (other than a missing argument)."""
-
-    def __init__(self, code):
-        self.code = code
-
-    def __eq__(self, other):
-        return isinstance(other, ErrorValue) and other.code == self.code
-
-    def __hash__(self):
-        return hash(("ErrorValue", self.code))
-
-    def __repr__(self):
-        return f"ErrorValue({self.code})"
-
-
-class Array(list):
-    """A one-dimensional array with a lower bound other than zero."""
-
-    def __init__(self, values=(), lbound=0):
-        super().__init__(values)
-        self.lbound = lbound
-
-    def __eq__(self, other):
-        return (isinstance(other, list) and list.__eq__(self, other)
-                and getattr(other, "lbound", 0) == self.lbound)
-
-    __hash__ = None
-
-    def __repr__(self):
-        return f"Array({list.__repr__(self)}, lbound={self.lbound})"
-
-
-class Array2D(list):
-    """A two-dimensional array: a list of rows over the first dimension, with its bounds
-    ``((lower1, upper1), (lower2, upper2))``; element (i, j) is ``self[i - lower1][j - lower2]``."""
-
-    def __init__(self, rows=(), bounds=None):
-        super().__init__([list(row) for row in rows])
-        if bounds is None:
-            columns = len(self[0]) if self else 0
-            bounds = ((0, len(self) - 1), (0, columns - 1))
-        self.bounds = tuple(tuple(pair) for pair in bounds)
-
-    def __eq__(self, other):
-        return (isinstance(other, list) and list.__eq__(self, other)
-                and getattr(other, "bounds", None) == self.bounds)
-
-    __hash__ = None
-
-    def __repr__(self):
-        return f"Array2D({list.__repr__(self)}, bounds={self.bounds})"
+EventHandler = Callable[["Event"], Optional[Sequence[Any]]]
+"""A handler of ``Client.on``: it may return the event's final arguments instead of
+assigning them to ``event.args``."""
 
 
 class Event:
     """One event raised by the component. Handlers change by-reference arguments by
     assigning to ``args``; assignments to by-value arguments are ignored by the server."""
 
-    def __init__(self, source, name, dispid, args):
+    def __init__(self, source: Optional[Proxy], name: str, dispid: Optional[int],
+                 args: List[Any]) -> None:
         self.source = source
         self.name = name
         self.dispid = dispid
         self.args = args
 
-    def __repr__(self):
+    def __repr__(self) -> str:
         return f"Event({self.name!r}, {self.args!r})"
 
 
 # Classes the component hands out that its type library does not list: member kinds as
 # the type library gives them ("indexed": a property read with arguments).
-_PLATFORM_CLASSES = {
+_PLATFORM_CLASSES: Dict[str, Dict[str, str]] = {
     "Scripting.Dictionary": {
         "item": "indexed", "add": "method", "count": "get", "exists": "method",
         "items": "method", "keys": "method", "remove": "method", "removeall": "method",
@@ -176,22 +61,23 @@ class Proxy:
 
     __slots__ = ("_client", "_handle", "_class", "_refs", "__weakref__")
 
-    def __init__(self, client, handle, class_name=None):
+    def __init__(self, client: Client, handle: int, class_name: Optional[str] = None) -> None:
         object.__setattr__(self, "_client", client)
         object.__setattr__(self, "_handle", handle)
         object.__setattr__(self, "_class", class_name)
         object.__setattr__(self, "_refs", 1)
 
     @property
-    def handle(self):
+    def handle(self) -> int:
+        """The server's handle of the object."""
         return self._handle
 
     @property
-    def class_name(self):
+    def class_name(self) -> Optional[str]:
         """The class as far as the host can tell (from the type library), or None."""
         return self._class
 
-    def __getattr__(self, name):
+    def __getattr__(self, name: str) -> Any:
         if name.startswith("_"):
             raise AttributeError(name)
         kind = self._client._member_kind(self._class, name)
@@ -199,26 +85,26 @@ class Proxy:
             return self._client.invoke(self, name, kind="get")
         return _BoundMember(self, name, kind)
 
-    def __setattr__(self, name, value):
+    def __setattr__(self, name: str, value: Any) -> None:
         if name.startswith("_"):
             object.__setattr__(self, name, value)
             return
         kind = "putref" if isinstance(value, Proxy) or value is NOTHING else "put"
         self._client.invoke(self, name, value, kind=kind)
 
-    def __getitem__(self, key):
+    def __getitem__(self, key: Any) -> Any:
         args = key if isinstance(key, tuple) else (key,)
         return self._client._call_default(self, None, args)
 
-    def __setitem__(self, key, value):
+    def __setitem__(self, key: Any, value: Any) -> None:
         args = (key if isinstance(key, tuple) else (key,)) + (value,)
         kind = "putref" if isinstance(value, Proxy) or value is NOTHING else "put"
         self._client._call_default(self, kind, args)
 
-    def __iter__(self):
+    def __iter__(self) -> Iterator[Any]:
         return iter(self._client.enumerate(self))
 
-    def __len__(self):
+    def __len__(self) -> int:
         try:
             return self._client.invoke(self, "Count")
         except ComError as error:
@@ -226,21 +112,22 @@ class Proxy:
                 raise TypeError(f"{self!r} has no Count") from error
             raise
 
-    def __bool__(self):
+    def __bool__(self) -> bool:
         return True
 
-    def invoke(self, member, *args, kind=None):
+    def invoke(self, member: Union[str, int], *args: Any, kind: Optional[str] = None) -> Any:
         """Calls a member by name (or dispatch id, given as an int); the result only."""
         return self._client.invoke(self, member, *args, kind=kind)
 
-    def invoke_full(self, member, *args, kind=None):
+    def invoke_full(self, member: Union[str, int], *args: Any,
+                    kind: Optional[str] = None) -> Tuple[Any, List[Any]]:
         """Calls a member; returns (result, final arguments) for by-reference results."""
         return self._client.invoke_full(self, member, *args, kind=kind)
 
-    def __repr__(self):
+    def __repr__(self) -> str:
         return f"<Proxy {self._class or 'object'} #{self._handle}>"
 
-    def __del__(self):
+    def __del__(self) -> None:
         client = self._client
         if client is not None:
             client._forget(self)
@@ -250,58 +137,63 @@ class _BoundMember:
     """A member of a proxy: call it to call the method (or read an indexed property);
     ``get``, ``put`` and ``full`` are explicit."""
 
-    def __init__(self, proxy, name, kind):
+    def __init__(self, proxy: Proxy, name: str, kind: Optional[str]) -> None:
         self._proxy = proxy
         self._name = name
         self._kind = kind
 
-    def __call__(self, *args):
+    def __call__(self, *args: Any) -> Any:
         kind = "get" if self._kind == "indexed" else None
         return self._proxy._client.invoke(self._proxy, self._name, *args, kind=kind)
 
-    def get(self, *args):
+    def get(self, *args: Any) -> Any:
         return self._proxy._client.invoke(self._proxy, self._name, *args, kind="get")
 
-    def put(self, *args):
+    def put(self, *args: Any) -> Any:
         return self._proxy._client.invoke(self._proxy, self._name, *args, kind="put")
 
-    def full(self, *args):
+    def full(self, *args: Any) -> Tuple[Any, List[Any]]:
         return self._proxy._client.invoke_full(self._proxy, self._name, *args)
 
-    def __repr__(self):
+    def __repr__(self) -> str:
         return f"<member {self._name} of {self._proxy!r}>"
 
 
 class Client:
     """A running ``ludmoxd`` and the host's end of the conversation.
 
-    ``path`` defaults to ``$LUDMOX_LUDMOXD``, then ``ludmoxd`` on the PATH. ``stderr`` is
-    passed to ``subprocess.Popen`` (the server writes diagnostics there).
+    ``path`` is the server to start; without it ``$LUDMOX_LUDMOXD``, then ``ludmoxd`` on
+    the PATH (see ``find_server``, which raises ``ServerNotFoundError`` when there is none).
+    ``args`` are its command-line arguments and ``env`` its environment (default: this
+    process's). ``stderr`` is passed to ``subprocess.Popen`` (the server writes diagnostics
+    there). The client owns the process: ``close`` ends it.
     """
 
-    def __init__(self, path=None, args=(), env=None, stderr=None):
-        path = path or os.environ.get("LUDMOX_LUDMOXD") or "ludmoxd"
+    def __init__(self, path: Union[str, "os.PathLike[str]", None] = None,
+                 args: Sequence[str] = (), env: Optional[Mapping[str, str]] = None,
+                 stderr: Union[None, int, IO[Any]] = None) -> None:
+        path = find_server(path)
         self._process = subprocess.Popen(
             [path, *args], stdin=subprocess.PIPE, stdout=subprocess.PIPE, stderr=stderr,
             env=env)
         self._next_id = 1
-        self._answers = {}
-        self._proxies = weakref.WeakValueDictionary()
-        self._releases = []
-        self._handlers = {}
-        self._typelib = None
-        self._classes = {}
+        self._answers: Dict[int, Dict[str, Any]] = {}
+        self._proxies: weakref.WeakValueDictionary[int, Proxy] = weakref.WeakValueDictionary()
+        self._releases: List[int] = []
+        self._handlers: Dict[Tuple[int, str], Tuple[EventHandler, Proxy]] = {}
+        self._typelib: Optional[Dict[str, Any]] = None
+        self._classes: Dict[str, Dict[str, Any]] = {}
         self._closed = False
 
     # Lifetime -----------------------------------------------------------------------
 
-    def __enter__(self):
+    def __enter__(self) -> Client:
         return self
 
-    def __exit__(self, *exc):
+    def __exit__(self, *exc: object) -> None:
         self.close()
 
-    def close(self, timeout=30):
+    def close(self, timeout: Optional[float] = 30) -> int:
         """Closes the server's input (it then releases every object) and waits for it to
         end; returns its exit code."""
         if not self._closed:
@@ -314,18 +206,19 @@ class Client:
         self._process.stdout.close()
         return code
 
-    def shutdown(self):
+    def shutdown(self) -> int:
         """Asks the server to end; it releases every object."""
         self._request("shutdown", {})
         return self.close()
 
     @property
-    def process(self):
+    def process(self) -> subprocess.Popen[bytes]:
+        """The server's process."""
         return self._process
 
     # The protocol -------------------------------------------------------------------
 
-    def typelib(self):
+    def typelib(self) -> Dict[str, Any]:
         """The component's type library (cached)."""
         if self._typelib is None:
             self._typelib = self._request("typelib", {})
@@ -337,12 +230,13 @@ class Client:
                 self._classes[entry["name"]] = {"entry": entry, "members": members}
         return self._typelib
 
-    def create(self, class_name):
+    def create(self, class_name: str) -> Proxy:
         """Creates an object of a creatable class (or Scripting.Dictionary)."""
         result = self._request("create", {"class": class_name})
         return self._proxy(result["object"], class_name)
 
-    def dictionary(self, mapping=None, compare_mode=None):
+    def dictionary(self, mapping: Optional[Mapping[Any, Any]] = None,
+                   compare_mode: Optional[int] = None) -> Proxy:
         """A new Scripting.Dictionary, filled from a mapping."""
         proxy = self.create("Scripting.Dictionary")
         if compare_mode is not None:
@@ -351,13 +245,15 @@ class Client:
             proxy.Add(key, value)
         return proxy
 
-    def invoke(self, obj, member, *args, kind=None):
+    def invoke(self, obj: Proxy, member: Union[str, int], *args: Any,
+               kind: Optional[str] = None) -> Any:
         """Calls a member of an object by name or dispatch id; returns its result."""
         return self.invoke_full(obj, member, *args, kind=kind)[0]
 
-    def invoke_full(self, obj, member, *args, kind=None):
+    def invoke_full(self, obj: Proxy, member: Union[str, int], *args: Any,
+                    kind: Optional[str] = None) -> Tuple[Any, List[Any]]:
         """Calls a member; returns (result, final values of the arguments passed)."""
-        params = {"object": obj.handle}
+        params: Dict[str, Any] = {"object": obj.handle}
         if isinstance(member, int):
             params["dispid"] = member
         else:
@@ -377,11 +273,11 @@ class Client:
         ]
         return value, final
 
-    def enumerate(self, obj):
+    def enumerate(self, obj: Proxy) -> List[Any]:
         """What iterating the object yields."""
         return [self._decode(item) for item in self._request("enumerate", {"object": obj.handle})["items"]]
 
-    def on(self, obj, event_name, handler):
+    def on(self, obj: Proxy, event_name: str, handler: EventHandler) -> None:
         """Calls ``handler(event)`` when ``obj`` raises ``event_name``; the server raises the
         object's events that have a handler, and no others."""
         key = (obj.handle, event_name.lower())
@@ -397,12 +293,12 @@ class Client:
                 del self._handlers[key]
                 raise
 
-    def disconnect(self, obj):
+    def disconnect(self, obj: Proxy) -> None:
         """Stops the object's events and forgets its handlers."""
         self._handlers = {k: v for k, v in self._handlers.items() if k[0] != obj.handle}
         self._request("disconnect", {"object": obj.handle})
 
-    def release(self, obj):
+    def release(self, obj: Proxy) -> None:
         """Gives the object's references back now; the proxy is dead afterwards."""
         refs = obj._refs
         object.__setattr__(obj, "_refs", 0)
@@ -410,13 +306,13 @@ class Client:
         for _ in range(refs):
             self._request("release", {"object": obj.handle})
 
-    def send_raw(self, line):
+    def send_raw(self, line: Union[str, bytes]) -> None:
         """Writes one raw line to the server (for tests of malformed input)."""
         self._process.stdin.write(line if isinstance(line, bytes) else line.encode("utf-8"))
         self._process.stdin.write(b"\n")
         self._process.stdin.flush()
 
-    def read_message(self):
+    def read_message(self) -> Dict[str, Any]:
         """Reads one message from the server as it is (for tests)."""
         line = self._process.stdout.readline()
         if not line:
