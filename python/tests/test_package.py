@@ -1,4 +1,4 @@
-"""The package carries the project's version."""
+"""The package as a whole: its version and the names hosts import."""
 
 import os
 import re
@@ -18,6 +18,15 @@ class VersionTest(unittest.TestCase):
         self.assertIsNotNone(found, "no project(LudMox VERSION ...) in CMakeLists.txt")
         self.assertEqual(ludmox.__version__, found.group(1),
                          "bump python/ludmox/_version.py with the project's version")
+
+
+class CompatibilityTest(unittest.TestCase):
+    def test_former_module_name_gives_the_same_objects(self):
+        import ludmox_client
+        for name in ("Array", "Array2D", "Client", "ComError", "EMPTY", "ErrorValue", "Event",
+                     "MISSING", "NOTHING", "Proxy", "COMPONENT_ERROR", "INVALID_PARAMS"):
+            with self.subTest(name):
+                self.assertIs(getattr(ludmox_client, name), getattr(ludmox, name))
 
 
 if __name__ == "__main__":
