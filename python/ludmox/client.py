@@ -13,7 +13,7 @@ import os
 import subprocess
 import weakref
 from typing import (
-    IO, Any, Callable, Dict, Iterator, List, Mapping, Optional, Sequence, Tuple, Union,
+    IO, Any, Callable, Dict, Iterator, List, Mapping, Optional, Sequence, Tuple, Union, cast,
 )
 
 from .discovery import find_server
@@ -176,6 +176,9 @@ class Client:
         self._process = subprocess.Popen(
             [path, *args], stdin=subprocess.PIPE, stdout=subprocess.PIPE, stderr=stderr,
             env=env)
+        # Both are pipes: Popen was asked for them.
+        self._input = cast(IO[bytes], self._process.stdin)
+        self._output = cast(IO[bytes], self._process.stdout)
         self._next_id = 1
         self._answers: Dict[int, Dict[str, Any]] = {}
         self._proxies: weakref.WeakValueDictionary[int, Proxy] = weakref.WeakValueDictionary()
@@ -199,11 +202,11 @@ class Client:
         if not self._closed:
             self._closed = True
             try:
-                self._process.stdin.close()
+                self._input.close()
             except OSError:
                 pass
         code = self._process.wait(timeout=timeout)
-        self._process.stdout.close()
+        self._output.close()
         return code
 
     def shutdown(self) -> int:
@@ -224,7 +227,7 @@ class Client:
             self._typelib = self._request("typelib", {})
             self._classes = {}
             for entry in self._typelib["classes"]:
-                members = {}
+                members: Dict[str, List[Dict[str, Any]]] = {}
                 for member in entry["members"]:
                     members.setdefault(member["name"].lower(), []).append(member)
                 self._classes[entry["name"]] = {"entry": entry, "members": members}
@@ -275,7 +278,8 @@ class Client:
 
     def enumerate(self, obj: Proxy) -> List[Any]:
         """What iterating the object yields."""
-        return [self._decode(item) for item in self._request("enumerate", {"object": obj.handle})["items"]]
+        items = self._request("enumerate", {"object": obj.handle})["items"]
+        return [self._decode(item) for item in items]
 
     def on(self, obj: Proxy, event_name: str, handler: EventHandler) -> None:
         """Calls ``handler(event)`` when ``obj`` raises ``event_name``; the server raises the
@@ -308,13 +312,13 @@ class Client:
 
     def send_raw(self, line: Union[str, bytes]) -> None:
         """Writes one raw line to the server (for tests of malformed input)."""
-        self._process.stdin.write(line if isinstance(line, bytes) else line.encode("utf-8"))
-        self._process.stdin.write(b"\n")
-        self._process.stdin.flush()
+        self._input.write(line if isinstance(line, bytes) else line.encode("utf-8"))
+        self._input.write(b"\n")
+        self._input.flush()
 
     def read_message(self) -> Dict[str, Any]:
         """Reads one message from the server as it is (for tests)."""
-        line = self._process.stdout.readline()
+        line = self._output.readline()
         if not line:
             raise ConnectionError("ludmoxd ended")
         return json.loads(line)
@@ -324,8 +328,8 @@ class Client:
     def _send(self, message):
         text = json.dumps(message, ensure_ascii=True, allow_nan=False, separators=(",", ":"))
         try:
-            self._process.stdin.write(text.encode("ascii") + b"\n")
-            self._process.stdin.flush()
+            self._input.write(text.encode("ascii") + b"\n")
+            self._input.flush()
         except (BrokenPipeError, ValueError) as error:
             raise ConnectionError("ludmoxd is not running") from error
 

@@ -2,7 +2,7 @@
 
 from __future__ import annotations
 
-from typing import Any, Iterable, Optional, Sequence, Tuple
+from typing import Any, Iterable, List, Optional, Sequence, Tuple
 
 
 class _Singleton:
@@ -40,7 +40,7 @@ class ErrorValue:
         return f"ErrorValue({self.code})"
 
 
-class Array(list):
+class Array(List[Any]):
     """A one-dimensional array with a lower bound other than zero."""
 
     def __init__(self, values: Iterable[Any] = (), lbound: int = 0) -> None:
@@ -51,13 +51,13 @@ class Array(list):
         return (isinstance(other, list) and list.__eq__(self, other)
                 and getattr(other, "lbound", 0) == self.lbound)
 
-    __hash__ = None  # type: ignore[assignment]
+    __hash__ = None
 
     def __repr__(self) -> str:
         return f"Array({list.__repr__(self)}, lbound={self.lbound})"
 
 
-class Array2D(list):
+class Array2D(List[List[Any]]):
     """A two-dimensional array: a list of rows over the first dimension, with its bounds
     ``((lower1, upper1), (lower2, upper2))``; element (i, j) is ``self[i - lower1][j - lower2]``."""
 
@@ -73,7 +73,7 @@ class Array2D(list):
         return (isinstance(other, list) and list.__eq__(self, other)
                 and getattr(other, "bounds", None) == self.bounds)
 
-    __hash__ = None  # type: ignore[assignment]
+    __hash__ = None
 
     def __repr__(self) -> str:
         return f"Array2D({list.__repr__(self)}, bounds={self.bounds})"
