@@ -10,6 +10,7 @@ packages=(
     libgtest-dev libgmock-dev libbenchmark-dev
     libxlsxwriter-dev libcurl4-openssl-dev libsqlite3-dev sqlite3
     python3 python3-aiosmtpd python3-openpyxl poppler-utils qpdf
+    python3-setuptools python3-venv python3-pip
     libreoffice-calc-nogui chromium
     postgresql postgresql-client
     fonts-dejavu-core xvfb xauth

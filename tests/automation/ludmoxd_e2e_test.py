@@ -13,7 +13,7 @@ import subprocess
 import tempfile
 import unittest
 
-from ludmox_client import (
+from ludmox import (
     EMPTY, MISSING, NOTHING, Array, Array2D, Client, ComError, Proxy,
 )
 

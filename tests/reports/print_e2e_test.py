@@ -17,7 +17,7 @@ import time
 import unittest
 import zlib
 
-from ludmox_client import Client
+from ludmox import Client
 
 ECST_MSJET = 1
 PRINTING_COMPLETED = 3

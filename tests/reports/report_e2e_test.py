@@ -14,7 +14,7 @@ import tempfile
 import threading
 import unittest
 
-from ludmox_client import Array2D, Client, ComError
+from ludmox import Array2D, Client, ComError
 
 ECST_MSJET = 1
 USER_CANCELLED = -2147221351  # 0x80040099

@@ -17,7 +17,7 @@ import tempfile
 import unittest
 import zipfile
 
-from ludmox_client import Client
+from ludmox import Client
 
 ECST_MSJET = 1
 PDF, EXCEL, HTML = 31, 38, 32
