@@ -12,6 +12,7 @@ packages=(
     python3 python3-aiosmtpd python3-openpyxl poppler-utils qpdf
     libreoffice-calc-nogui chromium
     postgresql postgresql-client
+    unixodbc unixodbc-dev odbc-postgresql tdsodbc
     fonts-dejavu-core xvfb xauth
     cups cups-bsd cups-client printer-driver-cups-pdf
 )

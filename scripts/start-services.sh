@@ -5,7 +5,9 @@ set -euo pipefail
 # PostgreSQL for the report runtime's server-database tests: a cluster listening on
 # 127.0.0.1 and a role and database "ludmox_test" (password "ludmox_test"). The tests
 # read LUDMOX_PG_HOST, LUDMOX_PG_PORT, LUDMOX_PG_USER, LUDMOX_PG_PASSWORD and
-# LUDMOX_PG_DATABASE, with these values as defaults.
+# LUDMOX_PG_DATABASE, with these values as defaults. The ODBC run of the tests reaches the same
+# database through psqlODBC with a DSN-less connect string: it needs only the packages
+# (odbc-postgresql registers its drivers in /etc/odbcinst.ini), no DSN.
 start_postgresql() {
     if ! command -v pg_lsclusters >/dev/null 2>&1; then
         echo "start-services: PostgreSQL is not installed (scripts/setup-debian.sh installs it)" >&2
