@@ -311,6 +311,7 @@ TEST_F(PostgreSql, RecordsThroughOdbcEqualThoseThroughQpsql)
     EXPECT_EQ(odbc.at(11)[4], u"currency 12345678.123400"_s);
 }
 
+// scripts/start-services.sh makes the role ludmox_quote with this password.
 TEST_F(PostgreSql, OdbcLogonWithHostilePassword)
 {
     const QString problem = odbcProblem(m_server.odbcDriver);
@@ -320,16 +321,16 @@ TEST_F(PostgreSql, OdbcLogonWithHostilePassword)
                    << problem.toStdString();
         GTEST_SKIP() << "ODBC is not usable: " << problem.toStdString();
     }
-    // The test role may change its own password; it is set back whatever happens.
-    const QString hostile = u"p;w}d{x=y}} ;UID=postgres;"_s;
+    Server quote = m_server;
+    quote.user = u"ludmox_quote"_s;
+    quote.password = u"p;w}d{x=y}} ;UID=postgres;"_s;
     QString error;
-    ASSERT_TRUE(execute(m_server,
-        { u"ALTER ROLE CURRENT_USER PASSWORD '%1'"_s.arg(
-            QString(hostile).replace(u"'"_s, u"''"_s)) },
-        error))
-        << error.toStdString();
-    Server changed = m_server;
-    changed.password = hostile;
+    if (!execute(quote, { u"SELECT 1"_s }, error)) {
+        if (qEnvironmentVariableIsSet("LUDMOX_REQUIRE_ODBC"))
+            FAIL() << "the role ludmox_quote (scripts/start-services.sh) cannot log on: "
+                   << error.toStdString();
+        GTEST_SKIP() << "the role ludmox_quote is missing: " << error.toStdString();
+    }
     ProviderMap::setServerDriver(u"QODBC"_s);
     ProviderMap::setOdbcDriver(m_server.odbcDriver);
     registerRuntime();
@@ -337,24 +338,22 @@ TEST_F(PostgreSql, OdbcLogonWithHostilePassword)
     const QString server = m_server.host + u',' + m_server.port;
     const auto logOn = [&](const QString& password) -> std::optional<QString> {
         try {
-            application->logOnServer(u"PDSOLEDB.DLL"_s, server, m_server.database, m_server.user,
+            application->logOnServer(u"PDSOLEDB.DLL"_s, server, m_server.database, quote.user,
                 password, u"SQLOLEDB"_s, QString());
             return std::nullopt;
         } catch (const core::ComError& e) {
             return e.description();
         }
     };
-    const auto withHostile = logOn(hostile);
-    const auto withOld = logOn(m_server.password);
-    ASSERT_TRUE(execute(
-        changed, { u"ALTER ROLE CURRENT_USER PASSWORD '%1'"_s.arg(m_server.password) }, error))
-        << error.toStdString();
+    const auto withHostile = logOn(quote.password);
     EXPECT_FALSE(withHostile) << withHostile->toStdString();
-    ASSERT_TRUE(withOld) << "the old password still logs on";
+    // Cut where an unquoted string would end the value: that must not log on.
+    const auto withPrefix = logOn(u"p"_s);
+    ASSERT_TRUE(withPrefix) << "a part of the password logs on";
     // The failure names the route: driver and server.
-    EXPECT_TRUE(withOld->contains(u"ODBC driver \"%1\""_s.arg(m_server.odbcDriver)))
-        << withOld->toStdString();
-    EXPECT_TRUE(withOld->contains(m_server.host)) << withOld->toStdString();
+    EXPECT_TRUE(withPrefix->contains(u"ODBC driver \"%1\""_s.arg(m_server.odbcDriver)))
+        << withPrefix->toStdString();
+    EXPECT_TRUE(withPrefix->contains(m_server.host)) << withPrefix->toStdString();
 }
 
 } // namespace
