@@ -13,6 +13,7 @@ packages=(
     python3-setuptools python3-venv python3-pip
     libreoffice-calc-nogui chromium
     postgresql postgresql-client
+    unixodbc unixodbc-dev odbc-postgresql tdsodbc
     fonts-dejavu-core xvfb xauth
     cups cups-bsd cups-client printer-driver-cups-pdf
     help2man man-db

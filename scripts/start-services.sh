@@ -5,7 +5,9 @@ set -euo pipefail
 # PostgreSQL for the report runtime's server-database tests: a cluster listening on
 # 127.0.0.1 and a role and database "ludmox_test" (password "ludmox_test"). The tests
 # read LUDMOX_PG_HOST, LUDMOX_PG_PORT, LUDMOX_PG_USER, LUDMOX_PG_PASSWORD and
-# LUDMOX_PG_DATABASE, with these values as defaults.
+# LUDMOX_PG_DATABASE, with these values as defaults. The ODBC run of the tests reaches the same
+# database through psqlODBC with a DSN-less connect string: it needs only the packages
+# (odbc-postgresql registers its drivers in /etc/odbcinst.ini), no DSN.
 start_postgresql() {
     if ! command -v pg_lsclusters >/dev/null 2>&1; then
         echo "start-services: PostgreSQL is not installed (scripts/setup-debian.sh installs it)" >&2
@@ -39,6 +41,15 @@ start_postgresql() {
     if ! "${as_postgres[@]}" psql -p "$port" -tAc "SELECT 1 FROM pg_database WHERE datname = '$database'" | grep -q 1; then
         "${as_postgres[@]}" psql -p "$port" -q -c "CREATE DATABASE $database OWNER $user"
     fi
+    # A role whose password holds what an ODBC connect string treats specially, for the test
+    # that logs on with it through psqlODBC (the password goes in as a psql variable, quoted
+    # by psql).
+    local quote_user=ludmox_quote quote_password='p;w}d{x=y}} ;UID=postgres;'
+    if ! "${as_postgres[@]}" psql -p "$port" -tAc "SELECT 1 FROM pg_roles WHERE rolname = '$quote_user'" | grep -q 1; then
+        "${as_postgres[@]}" psql -p "$port" -q -c "CREATE ROLE $quote_user LOGIN"
+    fi
+    echo "ALTER ROLE $quote_user LOGIN PASSWORD :'password';" \
+        | "${as_postgres[@]}" psql -p "$port" -q -v ON_ERROR_STOP=1 -v password="$quote_password"
     echo "start-services: PostgreSQL $version/$cluster on 127.0.0.1:$port, database $database"
 }
 

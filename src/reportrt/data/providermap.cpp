@@ -117,15 +117,25 @@ bool namesDatabaseFile(const QString& server)
     return false;
 }
 
-/// ODBC connect-string values with ";" or braces are written in braces.
+/// A value of an ODBC connect string. Unbraced, a ";" would end the attribute and start one
+/// the host never meant ("PWD=x;DRIVER=..."), a leading "{" would open a braced value and
+/// outer blanks are dropped; in braces only "}" is special and is doubled.
 QString odbcValue(const QString& value)
 {
-    if (!value.contains(u';') && !value.contains(u'{') && !value.contains(u'}')
-        && value.trimmed() == value)
+    const bool plain = !value.contains(u';') && !value.contains(u'{') && !value.contains(u'}')
+        && !value.contains(u'=') && value.trimmed() == value;
+    if (plain)
         return value;
     QString escaped = value;
     escaped.replace(u'}', QStringLiteral("}}"));
     return u'{' + escaped + u'}';
+}
+
+/// Microsoft's ODBC drivers ("ODBC Driver 18 for SQL Server", "SQL Server Native Client
+/// 11.0") read the port from SERVER and ignore PORT.
+bool takesPortInServer(const QString& odbcDriver)
+{
+    return odbcDriver.contains(u"SQL Server", Qt::CaseInsensitive);
 }
 } // namespace
 
@@ -135,7 +145,8 @@ QString ConnectionSpec::describe() const
         return QStringLiteral("SQLite database %1").arg(databaseName);
     if (driver == u"QPSQL")
         return QStringLiteral("PostgreSQL database %1 on %2").arg(databaseName, hostName);
-    return QStringLiteral("ODBC database %1 on %2").arg(options, hostName);
+    return QStringLiteral("ODBC database %1 on %2 (ODBC driver \"%3\")")
+        .arg(databaseName, hostName, odbcDriver);
 }
 
 QString ConnectionSpec::key() const
@@ -144,8 +155,29 @@ QString ConnectionSpec::key() const
     const QByteArray hash
         = QCryptographicHash::hash(password.toUtf8(), QCryptographicHash::Sha256).toHex();
     return QStringList { driver, databaseName, hostName, QString::number(port), userName,
-        QString::fromLatin1(hash), options }
+        QString::fromLatin1(hash), options, odbcDriver,
+        integratedSecurity ? QStringLiteral("1") : QStringLiteral("0") }
         .join(QChar(0x1F));
+}
+
+QString ConnectionSpec::odbcConnectString() const
+{
+    QStringList attributes { u"DRIVER=" + odbcValue(odbcDriver) };
+    const bool portInServer = takesPortInServer(odbcDriver);
+    attributes << u"SERVER="
+            + odbcValue(
+                port > 0 && portInServer ? hostName + u',' + QString::number(port) : hostName);
+    if (port > 0 && !portInServer)
+        attributes << u"PORT=" + QString::number(port);
+    if (!databaseName.isEmpty())
+        attributes << u"DATABASE=" + odbcValue(databaseName);
+    if (integratedSecurity) {
+        attributes << QStringLiteral("Trusted_Connection=yes");
+    } else {
+        attributes << u"UID=" + odbcValue(userName);
+        attributes << u"PWD=" + odbcValue(password);
+    }
+    return attributes.join(u';') + u';';
 }
 
 ConnectionSpec ProviderMap::forServer(const QString& server, const QString& database,
@@ -179,21 +211,18 @@ ConnectionSpec ProviderMap::forServer(const QString& server, const QString& data
         return spec;
     }
     spec.driver = QStringLiteral("QODBC");
-    spec.dialect = SqlDialect::Generic;
+    spec.odbcDriver = odbcDriver();
+    spec.dialect = odbcDialect(spec.odbcDriver);
     spec.hostName = host;
     spec.port = port;
-    QString connect = QStringLiteral("DRIVER=%1;SERVER=%2;DATABASE=%3;")
-                          .arg(odbcValue(odbcDriver()),
-                              odbcValue(port > 0 ? host + u',' + QString::number(port) : host),
-                              odbcValue(database));
-    if (integratedSecurity && password.isEmpty()) {
-        connect += QStringLiteral("Trusted_Connection=yes;");
-    } else {
+    spec.databaseName = database;
+    spec.integratedSecurity = integratedSecurity && password.isEmpty();
+    if (!spec.integratedSecurity) {
         spec.userName = userId;
         spec.password = password;
     }
-    spec.databaseName = connect;
-    spec.options = database;
+    // A server that does not answer must not hold the report for the driver's default wait.
+    spec.options = QStringLiteral("SQL_ATTR_LOGIN_TIMEOUT=10");
     return spec;
 }
 
@@ -268,7 +297,21 @@ QString ProviderMap::odbcDriver()
         return settings().odbcDriver;
     const QString fromSite
         = platform::SiteSettings().value(platform::SiteSettings::Setting::OdbcDriver);
-    return fromSite.isEmpty() ? QStringLiteral("ODBC Driver 18 for SQL Server") : fromSite;
+    return fromSite.isEmpty() ? QStringLiteral("FreeTDS") : fromSite;
+}
+
+SqlDialect ProviderMap::serverDialect()
+{
+    return serverDriver() == u"QPSQL" ? SqlDialect::PostgreSQL : odbcDialect(odbcDriver());
+}
+
+SqlDialect ProviderMap::odbcDialect(const QString& name)
+{
+    const QString file = name.mid(name.lastIndexOf(u'/') + 1);
+    if (name.trimmed().startsWith(u"PostgreSQL", Qt::CaseInsensitive)
+        || file.startsWith(u"psqlodbc", Qt::CaseInsensitive))
+        return SqlDialect::PostgreSQL;
+    return SqlDialect::Generic;
 }
 
 void ProviderMap::addLogon(const ConnectionSpec& spec)
@@ -283,8 +326,7 @@ void ProviderMap::removeLogon(const QString& server, const QString& database, co
     std::erase_if(logons, [&](const ConnectionSpec& s) {
         return s.hostName.compare(probe.hostName, Qt::CaseInsensitive) == 0 && s.port == probe.port
             && s.userName.compare(userId, Qt::CaseInsensitive) == 0
-            && (s.databaseName.compare(probe.databaseName, Qt::CaseInsensitive) == 0
-                || s.options.compare(database, Qt::CaseInsensitive) == 0);
+            && s.databaseName.compare(probe.databaseName, Qt::CaseInsensitive) == 0;
     });
 }
 
@@ -295,8 +337,7 @@ std::optional<ConnectionSpec> ProviderMap::matchingLogon(
     for (const ConnectionSpec& s : settings().logons) {
         if (s.driver == probe.driver && s.hostName.compare(probe.hostName, Qt::CaseInsensitive) == 0
             && s.port == probe.port
-            && (s.databaseName.compare(probe.databaseName, Qt::CaseInsensitive) == 0
-                || s.options.compare(database, Qt::CaseInsensitive) == 0))
+            && s.databaseName.compare(probe.databaseName, Qt::CaseInsensitive) == 0)
             return s;
     }
     return std::nullopt;

@@ -26,8 +26,7 @@ SqlDialect dialectOf(const std::vector<ConnectionProperty>& properties)
         for (const auto& p : properties) {
             if (p.name.compare(u"Provider", Qt::CaseInsensitive) == 0
                 && p.text.startsWith(u"SQLOLEDB", Qt::CaseInsensitive))
-                return ProviderMap::serverDriver() == u"QPSQL" ? SqlDialect::PostgreSQL
-                                                               : SqlDialect::Generic;
+                return ProviderMap::serverDialect();
         }
         return SqlDialect::SQLite;
     }

@@ -1,5 +1,7 @@
 #include "reportrt/data/sqlconnection.h"
 
+#include "reportrt/data/odbcdrivers.h"
+
 #include <QFileInfo>
 #include <QSqlError>
 #include <QSqlQuery>
@@ -56,18 +58,37 @@ bool SqlConnection::open(QString& message)
         message = QStringLiteral("the database driver %1 is not installed").arg(m_spec.driver);
         return false;
     }
+    const bool isOdbc = m_spec.driver == u"QODBC";
+    if (isOdbc) {
+        // Asked first: the driver manager's own answer ("Can't open lib 'X' : file not
+        // found") does not say that X is the driver's name, nor what is installed.
+        message = OdbcDrivers::problem(m_spec.odbcDriver);
+        if (!message.isEmpty())
+            return false;
+    }
+    const QString connectString = isOdbc ? m_spec.odbcConnectString() : QString();
+    if (connectString.contains(QChar(0))) {
+        // Drivers read the string up to the first NUL; the rest would be lost unseen.
+        message = QStringLiteral("a logon value holds a NUL character");
+        return false;
+    }
     QSqlDatabase db = QSqlDatabase::contains(m_name)
         ? QSqlDatabase::database(m_name, false)
         : QSqlDatabase::addDatabase(m_spec.driver, m_name);
-    db.setDatabaseName(m_spec.databaseName);
-    if (!m_spec.hostName.isEmpty())
-        db.setHostName(m_spec.hostName);
-    if (m_spec.port > 0)
-        db.setPort(m_spec.port);
-    db.setUserName(m_spec.userName);
-    db.setPassword(m_spec.password);
-    if (m_spec.driver != u"QODBC")
-        db.setConnectOptions(m_spec.options);
+    if (isOdbc) {
+        // The credentials travel in the connect string, quoted: QODBC would append its user
+        // name and password unquoted.
+        db.setDatabaseName(connectString);
+    } else {
+        db.setDatabaseName(m_spec.databaseName);
+        if (!m_spec.hostName.isEmpty())
+            db.setHostName(m_spec.hostName);
+        if (m_spec.port > 0)
+            db.setPort(m_spec.port);
+        db.setUserName(m_spec.userName);
+        db.setPassword(m_spec.password);
+    }
+    db.setConnectOptions(m_spec.options);
     if (db.open()) {
         if (!isFile || isSqliteDatabase(db, message))
             return true;
@@ -76,8 +97,11 @@ bool SqlConnection::open(QString& message)
     }
     QString text = db.lastError().text();
     // Drivers may echo the connect string; never let a password through.
-    if (!m_spec.password.isEmpty())
+    if (!m_spec.password.isEmpty()) {
         text.replace(m_spec.password, QStringLiteral("****"));
+        text.replace(
+            QString(m_spec.password).replace(u'}', QStringLiteral("}}")), QStringLiteral("****"));
+    }
     message = text;
     return false;
 }
