@@ -41,7 +41,7 @@ endfunction()
 ludmox_add_shared_library(ludmox_reportrt_shared ludmoxreportrt ReportRT
     LIBRARIES ${LUDMOX_REPORTRT_OBJECT_LIBRARIES}
     LINK PUBLIC Qt6::Core Qt6::Gui Qt6::Widgets Qt6::PrintSupport
-        PRIVATE Qt6::Sql CURL::libcurl PkgConfig::XLSXWRITER)
+        PRIVATE Qt6::Sql CURL::libcurl PkgConfig::XLSXWRITER PkgConfig::ODBC)
 ludmox_add_shared_library(ludmox_shared ludmox LudMox
     LIBRARIES ${LUDMOX_COMPONENT_OBJECT_LIBRARIES}
     LINK PUBLIC ludmox_reportrt_shared Qt6::Widgets)
@@ -79,6 +79,10 @@ install(FILES ${PROJECT_BINARY_DIR}/LudMoxConfig.cmake
     ${PROJECT_BINARY_DIR}/LudMoxConfigVersion.cmake
     DESTINATION ${CMAKE_INSTALL_LIBDIR}/cmake/LudMox COMPONENT Development)
 
+# Relative to the file itself, so a package installed under another prefix (cmake --install
+# --prefix, a staging folder) still points at its own headers and libraries.
+file(RELATIVE_PATH LUDMOX_PC_PREFIX "${CMAKE_INSTALL_FULL_LIBDIR}/pkgconfig"
+    "${CMAKE_INSTALL_PREFIX}")
 configure_file(${PROJECT_SOURCE_DIR}/cmake/ludmox.pc.in ${PROJECT_BINARY_DIR}/ludmox.pc @ONLY)
 install(FILES ${PROJECT_BINARY_DIR}/ludmox.pc
     DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig COMPONENT Development)
@@ -101,7 +105,7 @@ function(ludmox_add_man_page target summary)
     set(page ${CMAKE_CURRENT_BINARY_DIR}/${target}.1)
     add_custom_command(OUTPUT ${page}
         COMMAND ${CMAKE_COMMAND} -E env QT_QPA_PLATFORM=offscreen ASAN_OPTIONS=detect_leaks=0
-            ${HELP2MAN_PROGRAM} --no-info --no-discard-stderr --name=${summary}
+            ${HELP2MAN_PROGRAM} --no-info --name=${summary}
             --output=${page} $<TARGET_FILE:${target}>
         DEPENDS ${target}
         COMMENT "Writing the manual page of ${target}"

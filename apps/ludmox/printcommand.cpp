@@ -14,8 +14,8 @@
 #include <QCommandLineParser>
 #include <QFileInfo>
 #include <QRegularExpression>
-#include <optional>
 #include <cstdio>
+#include <optional>
 
 using namespace Qt::StringLiterals;
 

@@ -10,8 +10,8 @@
 #include <QApplication>
 #include <QCommandLineParser>
 #include <csignal>
-#include <cstdlib>
 #include <cstdio>
+#include <cstdlib>
 #include <unistd.h>
 
 namespace {

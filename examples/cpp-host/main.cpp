@@ -1,5 +1,6 @@
 // A host program: an engine logged on to the sample database, the invoice report for a
-// range of orders (its parameters) narrowed by a record selection, exported to PDF.
+// range of orders (its parameters, all given: a host without a display cannot be asked)
+// narrowed by a record selection, exported to PDF.
 //
 //   cpp-host DATABASE REPORTS_FOLDER OUTPUT.pdf
 
@@ -20,23 +21,33 @@ int main(int argc, char* argv[])
     reportrt::registerRuntime();
 
     const QString database = QFileInfo(QString::fromLocal8Bit(argv[1])).absoluteFilePath();
-    const QString report = QDir(QString::fromLocal8Bit(argv[2])).filePath(QStringLiteral("invoice.rpt"));
+    const QString report
+        = QDir(QString::fromLocal8Bit(argv[2])).filePath(QStringLiteral("invoice.rpt"));
     QString output = QFileInfo(QString::fromLocal8Bit(argv[3])).absoluteFilePath();
     try {
         const auto moxEngine = std::make_shared<engine::MoxEngine115>();
         moxEngine->Init(3, false, 0, 0);
         // A SQLite file logs on the way a Jet database did: the file is the server.
-        moxEngine->SetLogonInfo(engine::ecstMSJET, database, QString(), QStringLiteral("admin"), QString());
-        const auto reportObject = moxEngine->GetReports()->Item(report);
+        moxEngine->SetLogonInfo(
+            engine::ecstMSJET, database, QString(), QStringLiteral("admin"), QString());
+        // The collection owns its reports: keep it as long as they are used.
+        const auto reports = moxEngine->GetReports();
+        const auto reportObject = reports->Item(report);
 
         auto parameters = std::make_shared<core::Dictionary>(core::Dictionary::TextCompare);
         parameters->setItem(core::Variant(QStringLiteral("FromOrder")), core::Variant(100));
         parameters->setItem(core::Variant(QStringLiteral("ToOrder")), core::Variant(110));
+        parameters->setItem(core::Variant(QStringLiteral("InvoiceDate")),
+            core::Variant(QStringLiteral("2026-12-31")));
+        parameters->setItem(core::Variant(QStringLiteral("DueDays")), core::Variant(30));
+        parameters->setItem(core::Variant(QStringLiteral("Note")),
+            core::Variant(QStringLiteral("Built against the installed LUD Mox.")));
         if (!reportObject->SetParams(parameters)) {
             std::fputs("cpp-host: the parameters do not fit the report\n", stderr);
             return 1;
         }
-        if (!reportObject->SetSelection(QString(), core::Variant(QStringLiteral("{Orders.ID} <= 105")))) {
+        if (!reportObject->SetSelection(
+                QString(), core::Variant(QStringLiteral("{Orders.OrderID} <= 105")))) {
             std::fputs("cpp-host: the selection cannot be applied\n", stderr);
             return 1;
         }
@@ -49,7 +60,7 @@ int main(int argc, char* argv[])
         }
         std::printf("wrote %s\n", qPrintable(output));
         reportObject->CloseReport();
-        moxEngine->GetReports()->Destroy();
+        reports->Destroy();
     } catch (const core::ComError& error) {
         std::fprintf(stderr, "cpp-host: error %d from %s: %s\n", error.number(),
             qPrintable(error.source()), qPrintable(error.description()));

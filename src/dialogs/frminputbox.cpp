@@ -315,7 +315,7 @@ void frmInputBox::createField(int index, const std::shared_ptr<InputBoxParamsIte
         connect(f.edit, &QLineEdit::textChanged, this, [this] { m_changed = true; });
         // Typing is handled key by key; this catches what reaches the text otherwise
         // (Delete, pasting) so that the separators still appear.
-        connect(f.edit, &QLineEdit::textEdited, this, [this, &f] {
+        connect(f.edit, &QLineEdit::textEdited, this, [&f] {
             if (f.isDate())
                 applyEdit(f.edit, InsertDateSeparator(editState(f.edit), dateEntrySettings()));
         });

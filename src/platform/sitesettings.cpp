@@ -82,7 +82,8 @@ std::span<const SiteSettings::Entry> SiteSettings::entries()
 QStringList SiteSettings::defaultFiles()
 {
     QStringList files;
-    for (const QString& folder : QStandardPaths::standardLocations(QStandardPaths::GenericConfigLocation))
+    for (const QString& folder :
+        QStandardPaths::standardLocations(QStandardPaths::GenericConfigLocation))
         files.append(QDir::cleanPath(folder + u"/ludmox/ludmox.conf"_s));
     return files;
 }

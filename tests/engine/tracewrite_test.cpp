@@ -54,7 +54,8 @@ TEST(TraceWrite, TheSiteSwitchWritesWhatCallersPassOff)
     QTemporaryDir folder;
     const QString path = folder.filePath(u"trace.log"_s);
     engine::TraceWrite(u"MoxReport_Initialize"_s, path, false);
-    EXPECT_TRUE(contents(path).endsWith(u" MoxReport_Initialize\r\n"_s)) << contents(path).toStdString();
+    EXPECT_TRUE(contents(path).endsWith(u" MoxReport_Initialize\r\n"_s))
+        << contents(path).toStdString();
 }
 
 TEST(TraceWrite, UnwritableFileLosesTheLineQuietly)

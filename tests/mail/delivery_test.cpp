@@ -1,5 +1,5 @@
 #include "mailfixture.h"
-#include "platform/settingsstore.h"
+#include "platform/sitesettings.h"
 #include "reportrt/mail/maildelivery.h"
 #include "reportrt/mail/mailerror.h"
 #include "reportrt/mail/mailrequest.h"
@@ -9,6 +9,7 @@
 #include <QFile>
 #include <QJsonArray>
 #include <QRandomGenerator>
+#include <QSettings>
 #include <gtest/gtest.h>
 
 using namespace Qt::StringLiterals;

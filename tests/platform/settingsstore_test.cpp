@@ -133,7 +133,8 @@ TEST_F(SettingsStoreTest, ApplicationsShareOneFileAndStayApart)
         EXPECT_EQ(store.getSetting(application, u"S"_s, u"k"_s), application);
     }
     EXPECT_EQ(store.filePath(), QDir(base.path()).absoluteFilePath(u"ludmox/ludmox.conf"_s));
-    EXPECT_EQ(QDir(base.path() + u"/ludmox"_s).entryList(QDir::Files), QStringList { u"ludmox.conf"_s });
+    EXPECT_EQ(
+        QDir(base.path() + u"/ludmox"_s).entryList(QDir::Files), QStringList { u"ludmox.conf"_s });
     // An application named like a site section does not become the site's mail settings.
     const platform::SiteSettings site({}, { store.filePath() });
     EXPECT_EQ(site.value(platform::SiteSettings::Setting::SmtpUrl), QString());

@@ -25,7 +25,8 @@ protected:
 
 TEST_F(SiteSettingsTest, EnvironmentThenUserThenSystem)
 {
-    const QString user = write(u"user.conf"_s, "[Mail]\nUrl=smtp://user\n[Database]\nOdbcDriver=\n");
+    const QString user
+        = write(u"user.conf"_s, "[Mail]\nUrl=smtp://user\n[Database]\nOdbcDriver=\n");
     const QString system = write(u"system.conf"_s,
         "[Mail]\nUrl=smtp://system\nFrom=site@example.com\n[Database]\nOdbcDriver=FreeTDS\n");
     QProcessEnvironment environment;
@@ -40,10 +41,11 @@ TEST_F(SiteSettingsTest, EnvironmentThenUserThenSystem)
     EXPECT_EQ(settings.value(Setting::SmtpUser), QString());
 }
 
+// In an INI file ";" starts a comment: a value holding one is written in double quotes.
 TEST_F(SiteSettingsTest, ValuesReadAsWritten)
 {
     const QString file = write(u"ludmox.conf"_s,
-        "[Printing]\nPdfPrinters=Archive=/srv/a;Inbox=/srv/b, c\n[Trace]\nEnabled=Yes\n"
+        "[Printing]\nPdfPrinters=\"Archive=/srv/a;Inbox=/srv/b, c\"\n[Trace]\nEnabled=Yes\n"
         "[Performance]\nTuneAllocator=0\n");
     const SiteSettings settings({}, { file });
     EXPECT_EQ(settings.value(Setting::PdfPrinters), u"Archive=/srv/a;Inbox=/srv/b, c"_s);

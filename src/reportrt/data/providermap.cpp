@@ -1,7 +1,6 @@
 #include "reportrt/data/providermap.h"
 
 #include "platform/sitesettings.h"
-
 #include "reportrt/base/runtimeerror.h"
 
 #include <QCryptographicHash>

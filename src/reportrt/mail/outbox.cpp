@@ -1,7 +1,6 @@
 #include "reportrt/mail/outbox.h"
 
 #include "platform/sitesettings.h"
-
 #include "reportrt/mail/mailerror.h"
 #include "reportrt/mail/maillogging_p.h"
 

@@ -1,6 +1,5 @@
-#include "reportrt/output/allocatortuning_p.h"
-
 #include "platform/sitesettings.h"
+#include "reportrt/output/allocatortuning_p.h"
 
 #include <QtGlobal>
 #include <mutex>
