@@ -12,6 +12,7 @@
 #include <QRegularExpression>
 #include <QString>
 #include <QStringList>
+#include <algorithm>
 #include <cmath>
 #include <cstddef>
 #include <cstdint>
@@ -116,10 +117,10 @@ bool isAtTopLevel(const QString& sql, const QString& needle)
     return false;
 }
 
-// WHERE keywords in plain statement text at parenthesis depth 0.
-int topLevelWheres(const QString& sql)
+// Where a keyword stands in plain statement text at parenthesis depth 0.
+std::vector<qsizetype> topLevelKeywords(const QString& sql, QStringView keyword)
 {
-    int count = 0;
+    std::vector<qsizetype> found;
     int depth = 0;
     for (qsizetype i = 0; i < sql.size();) {
         const qsizetype next = skipQuoted(sql, i);
@@ -128,16 +129,16 @@ int topLevelWheres(const QString& sql)
             continue;
         }
         if (depth == 0 && (i == 0 || !isWordChar(sql.at(i - 1)))
-            && QStringView(sql).mid(i).startsWith(u"WHERE", Qt::CaseInsensitive)
-            && (i + 5 == sql.size() || !isWordChar(sql.at(i + 5))))
-            ++count;
+            && QStringView(sql).mid(i).startsWith(keyword, Qt::CaseInsensitive)
+            && (i + keyword.size() == sql.size() || !isWordChar(sql.at(i + keyword.size()))))
+            found.push_back(i);
         if (sql.at(i) == u'(')
             ++depth;
         else if (sql.at(i) == u')')
             --depth;
         ++i;
     }
-    return count;
+    return found;
 }
 
 // An IN list holds only numbers, NULL and complete string literals, so no value can end
@@ -232,10 +233,19 @@ void checkSplice(const QString& sql, const QString& special, const QString& clau
         && sql.contains(QStringLiteral("FROM"), Qt::CaseInsensitive) && isWellFormed(sql)
         && isWellFormed(clause) && isWellFormed(special)) {
         // The filter is a condition of the outermost query: outside every literal, comment
-        // and sub-query, and that query keeps a single WHERE.
+        // and sub-query.
         check(isAtTopLevel(spliced, filter));
-        if (special.isEmpty() || !clause.contains(QStringLiteral("WHERE"), Qt::CaseInsensitive))
-            check(topLevelWheres(spliced) == 1);
+        // The filter joins the query after the last FROM (what comes before it, such as the
+        // first half of a UNION, is left alone): that query keeps one WHERE, or as many as
+        // it had.
+        const std::vector<qsizetype> froms = topLevelKeywords(sql, u"FROM");
+        if (!froms.empty()
+            && (special.isEmpty()
+                || !clause.contains(QStringLiteral("WHERE"), Qt::CaseInsensitive))) {
+            const size_t before = topLevelKeywords(sql.mid(froms.back()), u"WHERE").size();
+            check(topLevelKeywords(spliced.mid(froms.back()), u"WHERE").size()
+                == std::max<size_t>(1, before));
+        }
         check(isWellFormed(spliced));
     }
     for (const int32_t serverType : { 0, 1, 2, 3 })
