@@ -12,7 +12,6 @@
 #include <QRegularExpression>
 #include <QString>
 #include <QStringList>
-#include <algorithm>
 #include <cmath>
 #include <cstddef>
 #include <cstdint>
@@ -141,6 +140,24 @@ std::vector<qsizetype> topLevelKeywords(const QString& sql, QStringView keyword)
     return found;
 }
 
+// Whether the statement is one query: a single top-level FROM, then at most one WHERE,
+// GROUP BY and ORDER BY, in that order.
+bool isSingleQuery(const QString& sql)
+{
+    qsizetype last = -1;
+    for (const QStringView keyword : { u"FROM", u"WHERE", u"GROUP BY", u"ORDER BY" }) {
+        const std::vector<qsizetype> found = topLevelKeywords(sql, keyword);
+        if (found.size() > 1 || (keyword == u"FROM" && found.empty()))
+            return false;
+        if (!found.empty()) {
+            if (found.front() < last)
+                return false;
+            last = found.front();
+        }
+    }
+    return true;
+}
+
 // An IN list holds only numbers, NULL and complete string literals, so no value can end
 // the list or add to the statement.
 void checkInList(const QString& listClause, const QString& table)
@@ -235,17 +252,13 @@ void checkSplice(const QString& sql, const QString& special, const QString& clau
         // The filter is a condition of the outermost query: outside every literal, comment
         // and sub-query.
         check(isAtTopLevel(spliced, filter));
-        // The filter joins the query after the last FROM (what comes before it, such as the
-        // first half of a UNION, is left alone): that query keeps one WHERE, or as many as
-        // it had.
-        const std::vector<qsizetype> froms = topLevelKeywords(sql, u"FROM");
-        if (!froms.empty()
+        // One query with its clauses in SQL's order keeps a single WHERE. Statements with
+        // several queries or clauses out of order are not SQL; the filter still lands at the
+        // top level (above), after the last FROM.
+        if (isSingleQuery(sql)
             && (special.isEmpty()
-                || !clause.contains(QStringLiteral("WHERE"), Qt::CaseInsensitive))) {
-            const size_t before = topLevelKeywords(sql.mid(froms.back()), u"WHERE").size();
-            check(topLevelKeywords(spliced.mid(froms.back()), u"WHERE").size()
-                == std::max<size_t>(1, before));
-        }
+                || !clause.contains(QStringLiteral("WHERE"), Qt::CaseInsensitive)))
+            check(topLevelKeywords(spliced, u"WHERE").size() == 1);
         check(isWellFormed(spliced));
     }
     for (const int32_t serverType : { 0, 1, 2, 3 })
