@@ -64,6 +64,23 @@ qsizetype skipQuoted(const QString& sql, qsizetype i)
     return i;
 }
 
+// Whether the literal or quoted name opening at `open` and skipped to `end` was closed there:
+// a doubled quote inside is part of it, so '"""' at the very end is still open.
+bool isClosedQuote(const QString& sql, qsizetype open, qsizetype end)
+{
+    const QChar close = sql.at(open) == u'[' ? u']' : sql.at(open);
+    for (qsizetype j = open + 1; j < end; ++j) {
+        if (sql.at(j) != close)
+            continue;
+        if ((close == u'\'' || close == u'"') && j + 1 < sql.size() && sql.at(j + 1) == close) {
+            ++j;
+            continue;
+        }
+        return j + 1 == end;
+    }
+    return false;
+}
+
 // Whether every literal, comment and parenthesis of the statement is closed.
 bool isWellFormed(const QString& sql)
 {
@@ -72,10 +89,8 @@ bool isWellFormed(const QString& sql)
         const qsizetype next = skipQuoted(sql, i);
         if (next != i) {
             const QChar open = sql.at(i);
-            const QChar last = sql.at(next - 1);
-            if ((open == u'\'' || open == u'"' || open == u'`') && (next - i < 2 || last != open))
-                return false;
-            if (open == u'[' && last != u']')
+            if ((open == u'\'' || open == u'"' || open == u'`' || open == u'[')
+                && !isClosedQuote(sql, i, next))
                 return false;
             if (open == u'/' && (next - i < 4 || !sql.mid(next - 2).startsWith(u"*/")))
                 return false;
