@@ -64,6 +64,23 @@ qsizetype skipQuoted(const QString& sql, qsizetype i)
     return i;
 }
 
+// Whether the literal or quoted name opening at `open` and skipped to `end` was closed there:
+// a doubled quote inside is part of it, so '"""' at the very end is still open.
+bool isClosedQuote(const QString& sql, qsizetype open, qsizetype end)
+{
+    const QChar close = sql.at(open) == u'[' ? u']' : sql.at(open);
+    for (qsizetype j = open + 1; j < end; ++j) {
+        if (sql.at(j) != close)
+            continue;
+        if ((close == u'\'' || close == u'"') && j + 1 < sql.size() && sql.at(j + 1) == close) {
+            ++j;
+            continue;
+        }
+        return j + 1 == end;
+    }
+    return false;
+}
+
 // Whether every literal, comment and parenthesis of the statement is closed.
 bool isWellFormed(const QString& sql)
 {
@@ -72,10 +89,8 @@ bool isWellFormed(const QString& sql)
         const qsizetype next = skipQuoted(sql, i);
         if (next != i) {
             const QChar open = sql.at(i);
-            const QChar last = sql.at(next - 1);
-            if ((open == u'\'' || open == u'"' || open == u'`') && (next - i < 2 || last != open))
-                return false;
-            if (open == u'[' && last != u']')
+            if ((open == u'\'' || open == u'"' || open == u'`' || open == u'[')
+                && !isClosedQuote(sql, i, next))
                 return false;
             if (open == u'/' && (next - i < 4 || !sql.mid(next - 2).startsWith(u"*/")))
                 return false;
@@ -116,10 +131,10 @@ bool isAtTopLevel(const QString& sql, const QString& needle)
     return false;
 }
 
-// WHERE keywords in plain statement text at parenthesis depth 0.
-int topLevelWheres(const QString& sql)
+// Where a keyword stands in plain statement text at parenthesis depth 0.
+std::vector<qsizetype> topLevelKeywords(const QString& sql, QStringView keyword)
 {
-    int count = 0;
+    std::vector<qsizetype> found;
     int depth = 0;
     for (qsizetype i = 0; i < sql.size();) {
         const qsizetype next = skipQuoted(sql, i);
@@ -128,16 +143,34 @@ int topLevelWheres(const QString& sql)
             continue;
         }
         if (depth == 0 && (i == 0 || !isWordChar(sql.at(i - 1)))
-            && QStringView(sql).mid(i).startsWith(u"WHERE", Qt::CaseInsensitive)
-            && (i + 5 == sql.size() || !isWordChar(sql.at(i + 5))))
-            ++count;
+            && QStringView(sql).mid(i).startsWith(keyword, Qt::CaseInsensitive)
+            && (i + keyword.size() == sql.size() || !isWordChar(sql.at(i + keyword.size()))))
+            found.push_back(i);
         if (sql.at(i) == u'(')
             ++depth;
         else if (sql.at(i) == u')')
             --depth;
         ++i;
     }
-    return count;
+    return found;
+}
+
+// Whether the statement is one query: a single top-level FROM, then at most one WHERE,
+// GROUP BY and ORDER BY, in that order.
+bool isSingleQuery(const QString& sql)
+{
+    qsizetype last = -1;
+    for (const QStringView keyword : { u"FROM", u"WHERE", u"GROUP BY", u"ORDER BY" }) {
+        const std::vector<qsizetype> found = topLevelKeywords(sql, keyword);
+        if (found.size() > 1 || (keyword == u"FROM" && found.empty()))
+            return false;
+        if (!found.empty()) {
+            if (found.front() < last)
+                return false;
+            last = found.front();
+        }
+    }
+    return true;
 }
 
 // An IN list holds only numbers, NULL and complete string literals, so no value can end
@@ -232,10 +265,15 @@ void checkSplice(const QString& sql, const QString& special, const QString& clau
         && sql.contains(QStringLiteral("FROM"), Qt::CaseInsensitive) && isWellFormed(sql)
         && isWellFormed(clause) && isWellFormed(special)) {
         // The filter is a condition of the outermost query: outside every literal, comment
-        // and sub-query, and that query keeps a single WHERE.
+        // and sub-query.
         check(isAtTopLevel(spliced, filter));
-        if (special.isEmpty() || !clause.contains(QStringLiteral("WHERE"), Qt::CaseInsensitive))
-            check(topLevelWheres(spliced) == 1);
+        // One query with its clauses in SQL's order keeps a single WHERE. Statements with
+        // several queries or clauses out of order are not SQL; the filter still lands at the
+        // top level (above), after the last FROM.
+        if (isSingleQuery(sql)
+            && (special.isEmpty()
+                || !clause.contains(QStringLiteral("WHERE"), Qt::CaseInsensitive)))
+            check(topLevelKeywords(spliced, u"WHERE").size() == 1);
         check(isWellFormed(spliced));
     }
     for (const int32_t serverType : { 0, 1, 2, 3 })

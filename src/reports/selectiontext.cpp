@@ -149,6 +149,13 @@ bool endsInLineComment(const QString& sql)
     return false;
 }
 
+// text, with a line break after it when it ends in a line comment: the comment would
+// otherwise swallow what the splice puts after it (a closing parenthesis, AND, the filter).
+QString withLineCommentEnded(const QString& text)
+{
+    return endsInLineComment(text) ? text + QStringLiteral("\r\n") : text;
+}
+
 // 0-based index of the last occurrence of keyword as a word of the outermost query, or -1.
 // Literals, quoted names, comments and parenthesised sub-queries are passed over: a
 // keyword there is text or belongs to another query, and a filter placed after it would
@@ -375,29 +382,28 @@ QString SpliceFilter(const QString& sql, const QString& filter, const QString& s
 
     QString wherePart;
     if (where < 0 || where >= head.size()) {
-        wherePart = crlf + QStringLiteral("WHERE") + crlf + QStringLiteral("    ") + filter;
+        wherePart = crlf + QStringLiteral("WHERE") + crlf + QStringLiteral("    ")
+            + withLineCommentEnded(filter);
     } else {
         qsizetype conditionStart = where + 5;
         while (conditionStart < head.size() && isSpace(head.at(conditionStart)))
             ++conditionStart;
-        QString condition = trimmed(head.mid(conditionStart));
-        if (endsInLineComment(condition))
-            condition += crlf;
+        const QString condition = withLineCommentEnded(trimmed(head.mid(conditionStart)));
         qsizetype headEnd = where;
         while (headEnd > 0 && isSpace(head.at(headEnd - 1)))
             --headEnd;
         head = head.left(headEnd);
         if (condition.contains(QStringLiteral(" OR"), Qt::CaseInsensitive))
             wherePart = crlf + QStringLiteral("WHERE") + crlf + QStringLiteral("    (") + condition
-                + QStringLiteral(") AND (") + filter + u')';
+                + QStringLiteral(") AND (") + withLineCommentEnded(filter) + u')';
         else
             wherePart = crlf + QStringLiteral("WHERE") + crlf + QStringLiteral("    ") + condition
-                + QStringLiteral(" AND (") + filter + u')';
+                + QStringLiteral(" AND (") + withLineCommentEnded(filter) + u')';
     }
     if (!specialSelection.isEmpty() && !formulaClause.isEmpty()) {
         QString clause = formulaClause;
         clause.remove(u'{').remove(u'}');
-        wherePart += QStringLiteral("AND (") + clause + u')';
+        wherePart += QStringLiteral("AND (") + withLineCommentEnded(clause) + u')';
     }
     return head + wherePart + tail;
 }

@@ -250,6 +250,25 @@ TEST(SqlRewrite, FormulaClauseJoinsTheConditionWhenBothKindsAreGiven)
             u"    (Orders.Total > 100)AND (Orders.ID=5)", u"ORDER BY Orders.ID" }));
 }
 
+// A host's condition that ends in a line comment would comment out the closing parenthesis
+// (the statement fails) or what follows it on the line.
+TEST(SqlRewrite, HostConditionsEndingInACommentKeepTheirParentheses)
+{
+    const QString sql = QStringLiteral("SELECT a FROM t WHERE x = 1");
+    EXPECT_EQ(SpliceFilter(sql, QStringLiteral("y = 2 -- host note"), QString(), QString()),
+        QStringLiteral("SELECT a FROM t\r\nWHERE\r\n    x = 1 AND (y = 2 -- host note\r\n)"));
+    EXPECT_EQ(SpliceFilter(QStringLiteral("SELECT a FROM t"), QStringLiteral("y = 2 -- host note"),
+                  QString(), QString()),
+        QStringLiteral("SELECT a FROM t\r\nWHERE\r\n    y = 2 -- host note\r\n"));
+    EXPECT_EQ(SpliceFilter(sql, QStringLiteral("(y = 2)"), QStringLiteral("y = 2"),
+                  QStringLiteral("{t.z} = 3 -- why")),
+        QStringLiteral("SELECT a FROM t\r\nWHERE\r\n    x = 1 AND ((y = 2))AND (t.z = 3 -- "
+                       "why\r\n)"));
+    // A comment marker inside a literal is text: nothing is added.
+    EXPECT_EQ(SpliceFilter(sql, QStringLiteral("y = '--'"), QString(), QString()),
+        QStringLiteral("SELECT a FROM t\r\nWHERE\r\n    x = 1 AND (y = '--')"));
+}
+
 TEST(SqlRewrite, QuotesTheWholeStatementForTheServerType)
 {
     const QString sql = QStringLiteral("SELECT \"A\" FROM `B`");
