@@ -113,3 +113,9 @@ function(ludmox_add_man_page target summary)
     add_custom_target(${target}_man ALL DEPENDS ${page})
     install(FILES ${page} DESTINATION ${CMAKE_INSTALL_MANDIR}/man1 COMPONENT Runtime)
 endfunction()
+
+# The sample database maker and reports, which the command line exports by default.
+install(DIRECTORY ${PROJECT_SOURCE_DIR}/examples/reports
+    DESTINATION ${CMAKE_INSTALL_DATADIR}/ludmox/examples COMPONENT Runtime)
+install(PROGRAMS ${PROJECT_SOURCE_DIR}/examples/make_sample_db.py
+    DESTINATION ${CMAKE_INSTALL_DATADIR}/ludmox/examples COMPONENT Runtime)

@@ -43,7 +43,15 @@ for library in "$prefix/$libdir"/libludmox.so "$prefix/$libdir"/libludmoxreportr
     fi
 done
 
-python3 "$root/examples/make_sample_db.py" --output "$work/sample.db" >/dev/null
+python3 "$prefix/share/ludmox/examples/make_sample_db.py" --output "$work/sample.db" >/dev/null
+
+# The command line finds the installed sample reports by itself.
+"$prefix/bin/ludmox" export --database "$work/sample.db" --output "$work/samples" >/dev/null
+reports=$(ls "$prefix/share/ludmox/examples/reports"/*.rpt | wc -l)
+if [ "$reports" -eq 0 ] || [ "$(ls "$work/samples"/*.pdf | wc -l)" -ne "$reports" ]; then
+    echo "check-package: ludmox export did not export the $reports installed sample reports" >&2
+    exit 1
+fi
 
 # CMake package.
 cmake -S "$root/examples/cpp-host" -B "$work/host-cmake" -G Ninja \

@@ -8,6 +8,7 @@
 #include "runtime/report.h"
 
 #include <QCommandLineParser>
+#include <QCoreApplication>
 #include <QDir>
 #include <QElapsedTimer>
 #include <QFileInfo>
@@ -48,6 +49,20 @@ bool exportReport(reports::MoxReport115& report, const QString& format, const QS
     return report.SaveAsPDF(fileName, firstSave, tempFileOnly, forceSave);
 }
 
+/// The sample reports: installed beside the program (PREFIX/share/ludmox/examples/reports),
+/// else those of the source tree this program was built from, else the current folder's.
+QString sampleReports()
+{
+    const QString installed = QDir(QCoreApplication::applicationDirPath())
+                                  .absoluteFilePath(u"../share/ludmox/examples/reports"_s);
+    if (QFileInfo(installed).isDir())
+        return QDir::cleanPath(installed);
+    const QString source = QStringLiteral(LUDMOX_SOURCE_EXAMPLES) + u"/reports"_s;
+    if (QFileInfo(source).isDir())
+        return source;
+    return u"examples/reports"_s;
+}
+
 } // namespace
 
 int exportCommand(const QStringList& arguments)
@@ -60,8 +75,10 @@ int exportCommand(const QStringList& arguments)
     parser.addOption({ u"format"_s, u"pdf (the default), xlsx or html."_s, u"format"_s, u"pdf"_s });
     parser.addOption(
         { u"output"_s, u"The folder for the files (made when missing)."_s, u"folder"_s });
-    parser.addOption({ u"reports"_s, u"The folder of the reports to export when none are named."_s,
-        u"folder"_s, u"examples/reports"_s });
+    parser.addOption({ u"reports"_s,
+        u"The folder of the reports to export when none are named (default: the installed "
+        u"sample reports)."_s,
+        u"folder"_s, sampleReports() });
     ReportHost::addReportOptions(parser);
     if (!parser.parse(arguments)) {
         printError(parser.errorText());
