@@ -12,7 +12,10 @@
 #include <QDir>
 #include <QElapsedTimer>
 #include <QFileInfo>
+#include <QTemporaryFile>
+#include <cerrno>
 #include <cstdio>
+#include <cstring>
 
 using namespace Qt::StringLiterals;
 
@@ -31,22 +34,42 @@ void printError(const QString& text)
     std::fputs(qPrintable(u"ludmox: "_s + text + u'\n'), stderr);
 }
 
-/// Writes `target`; false when the report has no records (the file is then still written).
-bool exportReport(reports::MoxReport115& report, const QString& format, const QString& target)
+/// Writes `target` through the report object in one pass. Its usual route lays the report
+/// out twice (a scratch file to learn whether there are records, then the target); the user
+/// wants the file either way, so the report writes its "scratch" file straight to a hidden
+/// name beside the target, which replaces the target only once complete. On failure the
+/// report object removes that file and an existing target stays as it was.
+void exportReport(reports::MoxReport115& report, const QString& format, const QString& target)
 {
-    QString fileName = target;
-    bool tempFileOnly = false;
-    // The user asked for the file: a report without records is written too.
+    const QFileInfo info(target);
+    QString staging;
+    {
+        QTemporaryFile reserved(info.absolutePath() + u"/."_s + info.completeBaseName()
+            + u".XXXXXX."_s + info.suffix());
+        if (!reserved.open())
+            throw core::ComError(core::ErrorNumber::InvalidProcedureCall, u"ludmox"_s,
+                u"cannot write into %1: %2"_s.arg(info.absolutePath(), reserved.errorString()));
+        staging = reserved.fileName();
+    }
+    bool tempFileOnly = true;
     bool forceSave = true;
-    if (format == u"xlsx")
-        return report.SaveAsXLS(fileName, tempFileOnly, forceSave);
-    if (format == u"html") {
+    if (format == u"xlsx") {
+        report.SaveAsXLS(staging, tempFileOnly, forceSave);
+    } else if (format == u"html") {
         bool separatePages = false;
         bool navigator = false;
-        return report.SaveAsHTML(fileName, tempFileOnly, forceSave, separatePages, navigator);
+        report.SaveAsHTML(staging, tempFileOnly, forceSave, separatePages, navigator);
+    } else {
+        bool firstSave = false;
+        report.SaveAsPDF(staging, firstSave, tempFileOnly, forceSave);
     }
-    bool firstSave = false;
-    return report.SaveAsPDF(fileName, firstSave, tempFileOnly, forceSave);
+    if (::rename(QFile::encodeName(staging).constData(), QFile::encodeName(target).constData())
+        != 0) {
+        const QString cause = QString::fromLocal8Bit(std::strerror(errno));
+        QFile::remove(staging);
+        throw core::ComError(core::ErrorNumber::InvalidProcedureCall, u"ludmox"_s,
+            u"cannot replace %1: %2"_s.arg(target, cause));
+    }
 }
 
 /// The sample reports: installed beside the program (PREFIX/share/ludmox/examples/reports),
