@@ -16,4 +16,11 @@ void raise(int32_t number, const QString& description)
     throw core::ComError(number, errorSource(), description);
 }
 
+QString iniText(const QVariant& value)
+{
+    if (value.metaType().id() == QMetaType::QStringList)
+        return value.toStringList().join(QStringLiteral(", "));
+    return value.toString();
+}
+
 } // namespace platform::detail

@@ -2,6 +2,7 @@
 
 #include <QLoggingCategory>
 #include <QString>
+#include <QVariant>
 #include <core/comerror.h>
 #include <cstdint>
 
@@ -21,5 +22,9 @@ constexpr int32_t PrinterError = 482;
 QString errorSource();
 
 [[noreturn]] void raise(int32_t number, const QString& description);
+
+/// A value read from an INI file as the text it was written as: QSettings reads a hand-edited
+/// "key=a, b" as a list.
+QString iniText(const QVariant& value);
 
 } // namespace platform::detail

@@ -70,14 +70,6 @@ void enterSection(QSettings& settings, const QString& application, const QString
     settings.beginGroup(storedName(settings.childGroups(), encodeName(section)));
 }
 
-QString valueText(const QVariant& value)
-{
-    // A hand-edited line "key=a, b" reads as a list; give it back as it was written.
-    if (value.metaType().id() == QMetaType::QStringList)
-        return value.toStringList().join(u", "_s);
-    return value.toString();
-}
-
 } // namespace
 
 SettingsStore::SettingsStore()
@@ -106,7 +98,7 @@ std::optional<QString> SettingsStore::getSetting(
         enterSection(settings, application, section);
         const QString storedKey = storedName(settings.childKeys(), encodeName(key));
         if (settings.contains(storedKey))
-            return valueText(settings.value(storedKey));
+            return detail::iniText(settings.value(storedKey));
     }
     return std::nullopt;
 }

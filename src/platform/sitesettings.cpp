@@ -1,5 +1,7 @@
 #include "platform/sitesettings.h"
 
+#include "platform/platformglobal_p.h"
+
 #include <QDir>
 #include <QFileInfo>
 #include <QSettings>
@@ -57,11 +59,7 @@ QString SiteSettings::value(Setting setting) const
         if (!QFileInfo(file).isFile())
             continue;
         const QSettings settings(file, QSettings::IniFormat);
-        const QVariant stored = settings.value(key);
-        // "a, b" in a file reads as a list; the setting is the text as written.
-        const QString text = stored.metaType().id() == QMetaType::QStringList
-            ? stored.toStringList().join(u", "_s)
-            : stored.toString();
+        const QString text = detail::iniText(settings.value(key));
         if (!text.trimmed().isEmpty())
             return text.trimmed();
     }
