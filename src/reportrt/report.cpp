@@ -221,7 +221,7 @@ void Report::readRecords()
         m_lastPlan = p;
         m_status.recordsRead = m_cache.saved()->recordsRead;
         m_status.recordsSelected = static_cast<int32_t>(m_cache.saved()->records.size());
-        m_status.recordsPrinted = static_cast<int32_t>(m_result->records.size());
+        m_status.recordsPrinted = static_cast<int32_t>(m_result->size());
         m_status.setProgress(runtime::PrintingProgress::Completed);
         if (m_status.recordsSelected == 0 && m_noDataHandler) {
             bool cancel = false;

@@ -259,8 +259,8 @@ std::map<int, QStringList> everyValue(Report& report)
     if (!result)
         return values;
     const QJsonArray fields = everyColumnReport()[u"tables"_s].toArray()[0][u"fields"_s].toArray();
-    for (const qsizetype index : result->records) {
-        report.setCurrentRecord(index);
+    for (qsizetype position = 0; position < result->size(); ++position) {
+        report.setCurrentRecord(result->recordAt(position));
         QStringList row;
         for (const auto& field : fields) {
             const Value v

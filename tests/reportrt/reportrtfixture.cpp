@@ -167,8 +167,8 @@ std::vector<QString> column(const Report& report, const QString& reference)
     if (!result)
         return values;
     Report& mutableReport = const_cast<Report&>(report);
-    for (const qsizetype index : result->records) {
-        mutableReport.setCurrentRecord(index);
+    for (qsizetype position = 0; position < result->size(); ++position) {
+        mutableReport.setCurrentRecord(result->recordAt(position));
         const Value v = report.fieldValue(reference);
         values.push_back(v.isNull() ? QStringLiteral("<null>") : FormulaEvaluator::toText(v, 2));
     }

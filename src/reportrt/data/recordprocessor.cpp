@@ -39,7 +39,7 @@ struct Builder {
     void build(size_t level, const qsizetype* begin, const qsizetype* end, int parent)
     {
         if (level >= groups.size()) {
-            result.records.insert(result.records.end(), begin, end);
+            result.order.insert(result.order.end(), begin, end);
             return;
         }
         struct Run {
@@ -60,7 +60,7 @@ struct Builder {
             const RecordProcessor::Summary& s = summaries[static_cast<size_t>(group.topNSummary)];
             for (Run& run : runs)
                 run.summary = RecordProcessor::summarize(
-                    s.operation, *s.field, records, run.begin, run.end - run.begin);
+                    s.operation, *s.field, records, run.begin, 0, run.end - run.begin);
             std::stable_sort(runs.begin(), runs.end(),
                 [](const Run& a, const Run& b) { return compareKeys(a.summary, b.summary) > 0; });
             if (group.topN < 9999 && runs.size() > static_cast<size_t>(group.topN))
@@ -72,7 +72,7 @@ struct Builder {
             node.level = static_cast<int>(level) + 1;
             node.key = key(*run.begin, level);
             node.parent = parent;
-            node.firstRecord = static_cast<qsizetype>(result.records.size());
+            node.firstRecord = static_cast<qsizetype>(result.order.size());
             result.groups.push_back(std::move(node));
             if (parent >= 0)
                 result.groups[static_cast<size_t>(parent)].children.push_back(index);
@@ -80,15 +80,97 @@ struct Builder {
                 result.topGroups.push_back(index);
             build(level + 1, run.begin, run.end, index);
             result.groups[static_cast<size_t>(index)].recordCount
-                = static_cast<qsizetype>(result.records.size())
+                = static_cast<qsizetype>(result.order.size())
                 - result.groups[static_cast<size_t>(index)].firstRecord;
         }
     }
 };
+
+std::vector<bool> descendingKeys(const std::vector<RecordProcessor::Group>& groups,
+    const std::vector<RecordProcessor::Sort>& sorts)
+{
+    std::vector<bool> descending;
+    for (const RecordProcessor::Group& g : groups)
+        descending.push_back(g.order == SortOrder::Descending);
+    for (const RecordProcessor::Sort& s : sorts)
+        descending.push_back(s.order == SortOrder::Descending);
+    return descending;
+}
+
+// Groups records that already come in print order, keeping only the keys of the record
+// before. False, with result untouched, when a record is out of order or a group keeps
+// only its top N: then the records have to be sorted.
+bool groupInReadOrder(const RecordSet& records, const std::vector<RecordProcessor::Group>& groups,
+    const std::vector<RecordProcessor::Sort>& sorts, RecordProcessor::Result& result)
+{
+    for (const RecordProcessor::Group& g : groups) {
+        if (g.topN > 0)
+            return false;
+    }
+    const std::vector<bool> descending = descendingKeys(groups, sorts);
+    const size_t keyCount = descending.size();
+    if (keyCount == 0) {
+        result.count = records.size();
+        return true;
+    }
+    std::vector<Value> previous(keyCount);
+    std::vector<Value> current(keyCount);
+    RecordProcessor::Result grouped;
+    std::vector<int> open(groups.size(), -1);
+    const qsizetype count = records.size();
+    const auto close = [&](size_t level, qsizetype end) {
+        RecordProcessor::GroupNode& node = grouped.groups[static_cast<size_t>(open[level])];
+        node.recordCount = end - node.firstRecord;
+    };
+    for (qsizetype r = 0; r < count; ++r) {
+        const Value* record = records.record(r);
+        for (size_t g = 0; g < groups.size(); ++g)
+            current[g] = fieldValue(*groups[g].key, record);
+        for (size_t s = 0; s < sorts.size(); ++s)
+            current[groups.size() + s] = fieldValue(*sorts[s].key, record);
+        size_t changed = 0;
+        if (r > 0) {
+            changed = keyCount;
+            for (size_t k = 0; k < keyCount; ++k) {
+                const int c = compareKeys(previous[k], current[k]);
+                if (c == 0)
+                    continue;
+                if (descending[k] ? c < 0 : c > 0)
+                    return false;
+                changed = k;
+                break;
+            }
+        }
+        for (size_t level = changed; level < groups.size(); ++level) {
+            if (open[level] >= 0)
+                close(level, r);
+            const int index = static_cast<int>(grouped.groups.size());
+            RecordProcessor::GroupNode node;
+            node.level = static_cast<int>(level) + 1;
+            node.key = current[level];
+            node.parent = level > 0 ? open[level - 1] : -1;
+            node.firstRecord = r;
+            grouped.groups.push_back(std::move(node));
+            if (level > 0)
+                grouped.groups[static_cast<size_t>(open[level - 1])].children.push_back(index);
+            else
+                grouped.topGroups.push_back(index);
+            open[level] = index;
+        }
+        std::swap(previous, current);
+    }
+    for (size_t level = 0; level < groups.size(); ++level) {
+        if (open[level] >= 0)
+            close(level, count);
+    }
+    grouped.count = count;
+    result = std::move(grouped);
+    return true;
+}
 } // namespace
 
 Value RecordProcessor::summarize(SummaryOperation operation, const FormulaExpr& field,
-    const RecordSet& records, const qsizetype* indexes, qsizetype count)
+    const RecordSet& records, const qsizetype* indexes, qsizetype first, qsizetype count)
 {
     const bool currency = field.type == ValueType::Currency;
     double sum = 0;
@@ -97,7 +179,7 @@ Value RecordProcessor::summarize(SummaryOperation operation, const FormulaExpr& 
     qsizetype values = 0;
     Value best;
     for (qsizetype i = 0; i < count; ++i) {
-        const Value v = fieldValue(field, records.record(indexes[i]));
+        const Value v = fieldValue(field, records.record(indexes ? indexes[i] : first + i));
         if (v.isNull())
             continue;
         ++values;
@@ -149,13 +231,10 @@ RecordProcessor::Result RecordProcessor::process(const RecordSet& records,
     const std::vector<Summary>& summaries)
 {
     Result result;
-    const qsizetype count = records.size();
-    const size_t keyCount = groups.size() + sorts.size();
-    std::vector<Value> keys;
-    std::vector<qsizetype> order(static_cast<size_t>(count));
-    std::iota(order.begin(), order.end(), 0);
-    if (keyCount > 0) {
-        keys.resize(static_cast<size_t>(count) * keyCount);
+    if (!groupInReadOrder(records, groups, sorts, result)) {
+        const qsizetype count = records.size();
+        const size_t keyCount = groups.size() + sorts.size();
+        std::vector<Value> keys(static_cast<size_t>(count) * keyCount);
         for (qsizetype r = 0; r < count; ++r) {
             const Value* record = records.record(r);
             for (size_t g = 0; g < groups.size(); ++g)
@@ -164,11 +243,9 @@ RecordProcessor::Result RecordProcessor::process(const RecordSet& records,
                 keys[static_cast<size_t>(r) * keyCount + groups.size() + s]
                     = fieldValue(*sorts[s].key, record);
         }
-        std::vector<bool> descending;
-        for (const Group& g : groups)
-            descending.push_back(g.order == SortOrder::Descending);
-        for (const Sort& s : sorts)
-            descending.push_back(s.order == SortOrder::Descending);
+        const std::vector<bool> descending = descendingKeys(groups, sorts);
+        std::vector<qsizetype> order(static_cast<size_t>(count));
+        std::iota(order.begin(), order.end(), 0);
         std::stable_sort(order.begin(), order.end(), [&](qsizetype a, qsizetype b) {
             for (size_t k = 0; k < keyCount; ++k) {
                 int c = compareKeys(keys[static_cast<size_t>(a) * keyCount + k],
@@ -178,24 +255,26 @@ RecordProcessor::Result RecordProcessor::process(const RecordSet& records,
             }
             return false;
         });
+        Builder builder { records, groups, summaries, keys, keyCount, result };
+        builder.build(0, order.data(), order.data() + order.size(), -1);
+        result.count = static_cast<qsizetype>(result.order.size());
     }
-    Builder builder { records, groups, summaries, keys, keyCount, result };
-    builder.build(0, order.data(), order.data() + order.size(), -1);
 
+    const qsizetype* order = result.order.empty() ? nullptr : result.order.data();
     result.totals.resize(summaries.size());
     for (GroupNode& node : result.groups)
         node.summaries.resize(summaries.size());
     for (size_t s = 0; s < summaries.size(); ++s) {
         const Summary& summary = summaries[s];
         if (summary.level == 0) {
-            result.totals[s] = summarize(summary.operation, *summary.field, records,
-                result.records.data(), static_cast<qsizetype>(result.records.size()));
+            result.totals[s]
+                = summarize(summary.operation, *summary.field, records, order, 0, result.count);
             continue;
         }
         for (GroupNode& node : result.groups) {
             if (node.level == summary.level)
                 node.summaries[s] = summarize(summary.operation, *summary.field, records,
-                    result.records.data() + node.firstRecord, node.recordCount);
+                    order ? order + node.firstRecord : nullptr, node.firstRecord, node.recordCount);
         }
     }
     return result;

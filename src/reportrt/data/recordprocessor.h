@@ -41,24 +41,36 @@ public:
         Value key;
         int parent = -1;
         std::vector<int> children;
-        qsizetype firstRecord = 0; // position in Result::records
+        qsizetype firstRecord = 0; // print position (Result::recordAt)
         qsizetype recordCount = 0;
         std::vector<Value> summaries; // per summary of this node's level, else Null
     };
 
     struct Result {
-        std::vector<qsizetype> records; // record indexes in print order
+        /// The record index at each print position; empty when the records print in the
+        /// order they were read (the database sorted them), which needs no index at all.
+        std::vector<qsizetype> order;
+        qsizetype count = 0; // the records printed
+        qsizetype size() const { return count; }
+        qsizetype recordAt(qsizetype position) const
+        {
+            return order.empty() ? position : order[static_cast<size_t>(position)];
+        }
         std::vector<GroupNode> groups;
         std::vector<int> topGroups;
         std::vector<Value> totals; // per summary of level 0, else Null
     };
 
-    /// Raises FormulaException when a key or summary field fails on a record.
+    /// Records that arrive in print order (the statement sorted them as the report does)
+    /// are grouped in one pass without keeping their keys; others are sorted here. Raises
+    /// FormulaException when a key or summary field fails on a record.
     static Result process(const RecordSet& records, const std::vector<Group>& groups,
         const std::vector<Sort>& sorts, const std::vector<Summary>& summaries);
 
+    /// Summarizes count records: indexes[0..count), or from record first on when indexes
+    /// is null.
     static Value summarize(SummaryOperation operation, const FormulaExpr& field,
-        const RecordSet& records, const qsizetype* indexes, qsizetype count);
+        const RecordSet& records, const qsizetype* indexes, qsizetype first, qsizetype count);
 };
 
 } // namespace reportrt

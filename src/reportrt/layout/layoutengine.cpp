@@ -300,9 +300,9 @@ QImage Layout::blobImage(const Value& value)
 void Pass::setContext(const Instance& instance)
 {
     m_position = instance.position;
-    const qsizetype record = m_result && instance.position >= 0
-            && instance.position < static_cast<qsizetype>(m_result->records.size())
-        ? m_result->records[static_cast<size_t>(instance.position)]
+    const qsizetype record
+        = m_result && instance.position >= 0 && instance.position < m_result->size()
+        ? m_result->recordAt(instance.position)
         : -1;
     m_report.setCurrentRecord(record);
 }
@@ -361,8 +361,7 @@ QString Pass::text(const ReportObject& object)
 
 Value Pass::fieldValue(const ReportObject& object)
 {
-    if (!m_records || m_position < 0 || !m_result
-        || m_position >= static_cast<qsizetype>(m_result->records.size()))
+    if (!m_records || m_position < 0 || !m_result || m_position >= m_result->size())
         return {};
     auto found = m_references.find(&object);
     if (found == m_references.end())
@@ -370,7 +369,7 @@ Value Pass::fieldValue(const ReportObject& object)
                     .first;
     if (!found->second)
         return {};
-    const Value* record = m_records->record(m_result->records[static_cast<size_t>(m_position)]);
+    const Value* record = m_records->record(m_result->recordAt(m_position));
     try {
         return FormulaEvaluator::evaluate(*found->second, record, m_layout.printDate);
     } catch (const FormulaException& error) {
@@ -636,10 +635,7 @@ void Pass::placePageHeader()
 {
     if (!m_bands.pageHeader)
         return;
-    placeAt(
-        { m_bands.pageHeader,
-            m_result && m_next < static_cast<qsizetype>(m_result->records.size()) ? m_next
-                                                                                  : m_lastPlaced },
+    placeAt({ m_bands.pageHeader, m_result && m_next < m_result->size() ? m_next : m_lastPlaced },
         m_layout.y);
 }
 
@@ -655,7 +651,7 @@ void Pass::placePageFooter()
 void Pass::placeReportHeader()
 {
     if (m_bands.reportHeader)
-        place({ m_bands.reportHeader, m_result && !m_result->records.empty() ? 0 : -1 });
+        place({ m_bands.reportHeader, m_result && m_result->size() > 0 ? 0 : -1 });
 }
 
 void Pass::layOutSubreports(const Instance& host, const Prepared& prepared, double top)
@@ -678,8 +674,7 @@ void Pass::layOutSubreports(const Instance& host, const Prepared& prepared, doub
             if (expr && m_records && m_position >= 0) {
                 try {
                     value = FormulaEvaluator::evaluate(*expr,
-                        m_records->record(m_result->records[static_cast<size_t>(m_position)]),
-                        m_layout.printDate);
+                        m_records->record(m_result->recordAt(m_position)), m_layout.printDate);
                 } catch (const FormulaException& error) {
                     raiseError(Error::FormulaError, error.error().describe());
                 }
@@ -723,7 +718,7 @@ void Pass::run()
     m_next = 0;
     m_lastPlaced = -1;
     if (!m_isMain && m_bands.reportHeader)
-        place({ m_bands.reportHeader, m_result && !m_result->records.empty() ? 0 : -1 });
+        place({ m_bands.reportHeader, m_result && m_result->size() > 0 ? 0 : -1 });
 
     // Group nodes of each level in print order.
     std::vector<std::vector<int>> nodes(levels);
@@ -743,7 +738,7 @@ void Pass::run()
         below += shownHeight(m_bands.groupHeaders[l]);
     }
 
-    const qsizetype count = m_result ? static_cast<qsizetype>(m_result->records.size()) : 0;
+    const qsizetype count = m_result ? m_result->size() : 0;
     for (qsizetype position = 0; position < count; ++position) {
         m_next = position;
         for (size_t l = 0; l < levels; ++l) {

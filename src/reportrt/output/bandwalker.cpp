@@ -57,9 +57,7 @@ struct BandWalker::Private {
     void setPosition(qsizetype p)
     {
         position = p;
-        const qsizetype record = result && p >= 0 && p < qsizetype(result->records.size())
-            ? result->records[static_cast<size_t>(p)]
-            : -1;
+        const qsizetype record = result && p >= 0 && p < result->size() ? result->recordAt(p) : -1;
         report.setCurrentRecord(record);
     }
 
@@ -99,7 +97,7 @@ struct BandWalker::Private {
         const qsizetype saved = position;
         if (page == 1) {
             visit(visitor, reportHeader, Band::ReportHeader, 0,
-                result && !result->records.empty() ? 0 : -1);
+                result && result->size() > 0 ? 0 : -1);
             y += shownHeight(reportHeader);
         }
         visit(visitor, pageHeader, Band::PageHeader, 0, saved >= 0 ? saved : 0);
@@ -201,7 +199,7 @@ int BandWalker::groupLevels() const
 
 qsizetype BandWalker::recordCount() const
 {
-    return d->result ? static_cast<qsizetype>(d->result->records.size()) : 0;
+    return d->result ? d->result->size() : 0;
 }
 
 std::pair<qsizetype, qsizetype> BandWalker::groupRange(int level) const
@@ -291,15 +289,14 @@ Value BandWalker::value(const ReportObject& object)
         return Value::string(def.text);
     case Kind::Field:
     case Kind::Blob: {
-        if (!p.records || !p.result || p.position < 0
-            || p.position >= qsizetype(p.result->records.size()))
+        if (!p.records || !p.result || p.position < 0 || p.position >= p.result->size())
             return {};
         auto found = p.references.find(&object);
         if (found == p.references.end())
             found = p.references.emplace(&object, p.report.compiledReference(def.field)).first;
         if (!found->second)
             return {};
-        const Value* record = p.records->record(p.result->records[static_cast<size_t>(p.position)]);
+        const Value* record = p.records->record(p.result->recordAt(p.position));
         try {
             return FormulaEvaluator::evaluate(*found->second, record, p.printDate);
         } catch (const FormulaException& error) {
