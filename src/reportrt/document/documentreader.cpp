@@ -10,6 +10,7 @@
 #include <QFileInfo>
 #include <QRegularExpression>
 #include <QSet>
+#include <algorithm>
 #include <cmath>
 #include <numeric>
 
@@ -1031,7 +1032,15 @@ ReportDocument DocumentReader::readFile(const QString& path)
                 .arg(maxFileSize));
     if (!file.open(QIODevice::ReadOnly))
         raiseError(Error::OpenReportFailed, QStringLiteral("%1: %2").arg(path, file.errorString()));
-    const QByteArray data = file.read(maxFileSize + 1);
+    // Read by what the file holds: asking for the most a document may be would reserve
+    // that much memory for every report opened.
+    QByteArray data = file.read(std::min<qint64>(info.size(), maxFileSize) + 1);
+    while (data.size() <= maxFileSize && !file.atEnd()) {
+        const QByteArray more = file.read(std::min<qint64>(1 << 20, maxFileSize + 1 - data.size()));
+        if (more.isEmpty())
+            break;
+        data += more;
+    }
     if (data.size() > maxFileSize)
         raiseError(Error::OpenReportFailed,
             QStringLiteral("%1: the file is larger than %2 bytes").arg(path).arg(maxFileSize));
