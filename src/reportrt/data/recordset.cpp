@@ -11,9 +11,9 @@
 namespace reportrt {
 
 namespace {
-// 64 blocks, about 130,000 records: enough for every report that is not large, while a
-// large one stays at a few tens of megabytes.
-std::atomic<qsizetype> residentLimit { 64 * RecordSet::chunkRecords };
+// 16 blocks, about 32,000 records (some 15 MB): small reports never touch the disk, and a
+// large one costs one encoding and a decoding per pass, far less than laying it out.
+std::atomic<qsizetype> residentLimit { 16 * RecordSet::chunkRecords };
 
 // A spilled value is a tag byte and its payload: eight bytes for numbers and dates, a
 // length and the UTF-16 units for text, a length and the bytes for binary values.
