@@ -4,14 +4,11 @@
 #include "reportrt/base/runtimeerror.h"
 #include "reportrt/layout/pagination.h"
 #include "reportrt/output/allocatortuning_p.h"
-#include "reportrt/output/pagerenderer.h"
+#include "reportrt/output/pdfwriter.h"
 #include "reportrt/report.h"
 
 #include <QDir>
 #include <QFileInfo>
-#include <QPageLayout>
-#include <QPainter>
-#include <QPdfWriter>
 #include <condition_variable>
 #include <deque>
 #include <mutex>
@@ -85,7 +82,6 @@ private:
 struct Job {
     QString path;
     QString title;
-    PageGeometry geometry;
     const FontTable* fonts = nullptr;
     PageQueue queue;
     QString error; // set by the painting thread when it failed
@@ -100,35 +96,21 @@ void paint(Job& job)
         job.queue.abort();
         return;
     }
-    QPdfWriter writer(&file);
-    writer.setCreator(QStringLiteral("LUD Mox"));
+    PdfWriter writer(file, *job.fonts);
     writer.setTitle(job.title);
-    // Twips as device units: the layout's coordinates need no conversion.
-    writer.setResolution(1440);
-    writer.setPageLayout(QPageLayout(
-        QPageSize(QSizeF(job.geometry.width, job.geometry.height) / 20.0, QPageSize::Point),
-        QPageLayout::Portrait, QMarginsF()));
-    QPainter painter;
-    PageRenderer renderer(*job.fonts);
     bool first = true;
     while (std::optional<Page> page = job.queue.pop()) {
-        if (first) {
-            if (!painter.begin(&writer)) {
-                job.error = QStringLiteral("the PDF writer could not start");
-                job.queue.abort();
-                file.abandon();
-                return;
-            }
-            first = false;
-        } else if (!writer.newPage()) {
-            job.error = QStringLiteral("the PDF writer could not add a page");
+        first = false;
+        if (!writer.addPage(*page)) {
+            job.error = writer.error();
             job.queue.abort();
             break;
         }
-        renderer.paint(painter, *page);
     }
-    if (painter.isActive())
-        painter.end();
+    if (!job.queue.isAborted() && !first && !writer.finish()) {
+        job.error = writer.error();
+        job.queue.abort();
+    }
     if (job.queue.isAborted() || first) {
         file.abandon();
         return;
@@ -167,7 +149,6 @@ int PdfExporter::exportTo(Report& report, const QString& path)
     Job job;
     job.path = target.absoluteFilePath();
     job.title = report.title();
-    job.geometry = PageGeometry::of(report.pageSetup());
     job.fonts = &pagination.fonts();
     std::thread painter([&job] { paint(job); });
 
