@@ -25,12 +25,15 @@ ScriptedViewerControl::~ScriptedViewerControl()
         g_last = nullptr;
 }
 
-std::shared_ptr<void> ScriptedViewerControl::install()
+std::shared_ptr<void> ScriptedViewerControl::install(
+    std::function<void(ScriptedViewerControl&)> configure)
 {
     g_created = 0;
     g_last = nullptr;
-    auto previous = runtime::ViewerControlFactory::install([] {
+    auto previous = runtime::ViewerControlFactory::install([configure] {
         auto control = std::make_unique<ScriptedViewerControl>();
+        if (configure)
+            configure(*control);
         g_last = control.get();
         ++g_created;
         return std::unique_ptr<runtime::ViewerControl>(std::move(control));
@@ -83,6 +86,8 @@ void ScriptedViewerControl::setZoom(int32_t percent)
 void ScriptedViewerControl::viewReport()
 {
     record(u"viewReport()"_s);
+    if (onViewReport)
+        onViewReport();
 }
 
 void ScriptedViewerControl::refreshView(bool rereadData)

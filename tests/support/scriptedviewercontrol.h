@@ -26,9 +26,10 @@ public:
     ScriptedViewerControl();
     ~ScriptedViewerControl() override;
 
-    /// Installs a factory that makes scripted controls; returns the previous one's guard:
-    /// the factory is put back when the returned object goes.
-    [[nodiscard]] static std::shared_ptr<void> install();
+    /// Installs a factory that makes scripted controls, each passed to `configure` first;
+    /// returns a guard that puts the previous factory back when it goes.
+    [[nodiscard]] static std::shared_ptr<void> install(
+        std::function<void(ScriptedViewerControl&)> configure = {});
     /// The control made last by the installed factory, while it lives.
     static ScriptedViewerControl* last();
     /// How many controls the installed factory made.
@@ -72,6 +73,8 @@ public:
     int runningChecks = 0;
     LayoutState layoutAfter = LayoutState::Complete;
     mutable int layoutChecks = 0;
+    /// Runs inside viewReport, after it was recorded: a viewer notifies from there.
+    std::function<void()> onViewReport;
     /// Runs at each look at the layout state (inside the wait loop's yields, for one).
     std::function<void()> onLayoutCheck;
 
