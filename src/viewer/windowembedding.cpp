@@ -66,8 +66,11 @@ bool WindowEmbedding::embed(QWidget* widget, int32_t parent)
         return false;
     }
     QWindow* foreign = QWindow::fromWinId(toWId(parent));
-    if (!foreign) {
-        qCWarning(lcViewer) << "window" << parent << "cannot be wrapped";
+    // A foreign window of an id that names no window has no size: X11 answered nothing
+    // for it, and a widget moved into it would be lost.
+    if (!foreign || foreign->geometry().isEmpty()) {
+        delete foreign;
+        qCWarning(lcViewer) << "window" << parent << "is no window this process can reach";
         return false;
     }
     delete m_foreign.data();
