@@ -12,7 +12,8 @@ set(LUDMOX_REPORTRT_OBJECT_LIBRARIES ludmox_core ludmox_runtime ludmox_platform
     ludmox_reportrt_base ludmox_reportrt_formula ludmox_reportrt_document
     ludmox_reportrt_data ludmox_reportrt_model ludmox_reportrt_layout ludmox_reportrt_mail
     ludmox_reportrt_output)
-set(LUDMOX_COMPONENT_OBJECT_LIBRARIES ludmox_selection ludmox_component ludmox_automation)
+set(LUDMOX_COMPONENT_OBJECT_LIBRARIES ludmox_selection ludmox_component ludmox_viewer
+    ludmox_automation)
 
 # ludmox_add_shared_library(<target> <output name> <export name> LIBRARIES ... LINK ...)
 function(ludmox_add_shared_library target output export)
@@ -56,7 +57,9 @@ set(LUDMOX_PUBLIC_HEADERS
     ludmox/ludmox.h
     reportrt/output/registerruntime.h
     reports/enuprintprogress.h reports/moxevents115.h reports/moxreport115.h
-    reports/moxreports115.h reports/moxstatus115.h)
+    reports/moxreports115.h reports/moxstatus115.h
+    viewer/clsmoxviewer115.h viewer/imoxviewer115.h viewer/ludmoxviewerformsdi.h
+    viewer/moxviewer115.h)
 foreach(header IN LISTS LUDMOX_PUBLIC_HEADERS)
     get_filename_component(folder ${header} DIRECTORY)
     install(FILES ${PROJECT_SOURCE_DIR}/src/${header}

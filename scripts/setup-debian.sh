@@ -14,7 +14,7 @@ packages=(
     libreoffice-calc-nogui chromium
     postgresql postgresql-client
     unixodbc unixodbc-dev odbc-postgresql tdsodbc
-    fonts-dejavu-core xvfb xauth
+    fonts-dejavu-core xvfb xauth python3-tk imagemagick x11-apps
     cups cups-bsd cups-client printer-driver-cups-pdf
     help2man man-db
 )

@@ -5,6 +5,7 @@
 #include "logon.h"
 #include "ludmox/version.h"
 #include "mailcommand.h"
+#include "previewcommand.h"
 #include "printcommand.h"
 #include "reportrt/output/registerruntime.h"
 
@@ -45,6 +46,8 @@ int main(int argc, char* argv[])
         return exportCommand(arguments);
     if (arguments.value(1) == u"mail")
         return mailCommand(arguments);
+    if (arguments.value(1) == u"preview")
+        return previewCommand(arguments);
 
     QCommandLineParser parser;
     parser.setApplicationDescription(QStringLiteral(
@@ -54,22 +57,23 @@ int main(int argc, char* argv[])
         "Commands (COMMAND --help tells every option):\n"
         "  export REPORT...  write PDF, Excel or HTML files (--format, --output)\n"
         "  mail REPORT       mail a report as an attachment (--to, --subject, --format)\n"
+        "  preview REPORT    show a report in the preview window until it is closed\n"
         "  print REPORT      print on a printer (--printer, --copies, --pages, --paper)\n"
         "  printers          list the printers, the current one marked\n"
         "\n"
         "Every report command takes --logon (sqlite:FILE, postgres://... or odbc://...) or "
         "--database FILE, --param NAME=VALUE (repeatable) and --selection FORMULA.\n"
         "\n"
-        "Exit codes: 0 everything was written, sent or printed; 1 a report failed (one line "
-        "on standard error for each); 2 the command line or the database was wrong, nothing "
-        "was done.\n"
+        "Exit codes: 0 everything was written, sent, printed or shown; 1 a report failed (one "
+        "line on standard error for each); 2 the command line or the database was wrong, or "
+        "preview found no display; nothing was done.\n"
         "\n"
         "Settings: ~/.config/ludmox/ludmox.conf over /etc/xdg/ludmox/ludmox.conf, with "
         "LUDMOX_* variables over both."));
     parser.addHelpOption();
     parser.addVersionOption();
     parser.addPositionalArgument(
-        QStringLiteral("command"), QStringLiteral("export, mail, print or printers"));
+        QStringLiteral("command"), QStringLiteral("export, mail, preview, print or printers"));
     Logon::addOptions(parser);
     parser.addOption({ QStringLiteral("param"), QStringLiteral("A parameter value for the report."),
         QStringLiteral("name=value") });

@@ -11,6 +11,8 @@ void registerComponentTables(Registry& registry)
     registerMoxStatus115(registry);
     registerMoxEvents115(registry);
     registerMoxReport115(registry);
+    registerClsMoxViewer115(registry);
+    registerIMoxViewer115(registry);
 
     registerDictionary(registry);
     registerCollection(registry);

@@ -15,6 +15,8 @@ void registerMoxReports115(Registry& registry);
 void registerMoxStatus115(Registry& registry);
 void registerMoxEvents115(Registry& registry);
 void registerMoxReport115(Registry& registry);
+void registerClsMoxViewer115(Registry& registry);
+void registerIMoxViewer115(Registry& registry);
 
 // Platform and runtime classes: described for late binding, not in the type library.
 void registerDictionary(Registry& registry);

@@ -1,8 +1,8 @@
 #pragma once
 
 // Everything a host needs: the engine, its report collection and reports, their status and
-// events, the parameter dialog's model, the runtime's registration and the automation
-// server.
+// events, the parameter dialog's model, the preview window, the runtime's registration and
+// the automation server.
 
 #include "automation/server.h"
 #include "core/collection.h"
@@ -18,3 +18,7 @@
 #include "reports/moxreport115.h"
 #include "reports/moxreports115.h"
 #include "reports/moxstatus115.h"
+#include "viewer/clsmoxviewer115.h"
+#include "viewer/imoxviewer115.h"
+#include "viewer/ludmoxviewerformsdi.h"
+#include "viewer/moxviewer115.h"
