@@ -6,7 +6,7 @@
 #include "ludmox/version.h"
 #include "mailcommand.h"
 #include "printcommand.h"
-#include "reportrt/output/registerruntime.h"
+#include "reportrt/viewer/registerruntime.h"
 
 #include <QApplication>
 #include <QCommandLineParser>
