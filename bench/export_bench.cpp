@@ -6,8 +6,8 @@
 
 #include "core/comerror.h"
 #include "core/variant.h"
-#include "reportrt/output/registerruntime.h"
 #include "reportrt/report.h"
+#include "reportrt/viewer/registerruntime.h"
 #include "runtime/databasetable.h"
 #include "runtime/exportoptions.h"
 

@@ -11,7 +11,7 @@ include(CMakePackageConfigHelpers)
 set(LUDMOX_REPORTRT_OBJECT_LIBRARIES ludmox_core ludmox_runtime ludmox_platform
     ludmox_reportrt_base ludmox_reportrt_formula ludmox_reportrt_document
     ludmox_reportrt_data ludmox_reportrt_model ludmox_reportrt_layout ludmox_reportrt_mail
-    ludmox_reportrt_output)
+    ludmox_reportrt_output ludmox_reportrt_viewer)
 set(LUDMOX_COMPONENT_OBJECT_LIBRARIES ludmox_selection ludmox_component ludmox_viewer
     ludmox_automation)
 
@@ -55,7 +55,7 @@ set(LUDMOX_PUBLIC_HEADERS
     dialogs/inputboxparams.h dialogs/inputboxparamsitem.h
     engine/moxengine115.h engine/moxservertypes.h
     ludmox/ludmox.h
-    reportrt/output/registerruntime.h
+    reportrt/viewer/registerruntime.h
     reports/enuprintprogress.h reports/moxevents115.h reports/moxreport115.h
     reports/moxreports115.h reports/moxstatus115.h
     viewer/clsmoxviewer115.h viewer/imoxviewer115.h viewer/ludmoxviewerformsdi.h

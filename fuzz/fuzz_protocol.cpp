@@ -10,7 +10,7 @@
 #include "automation/jsontext.h"
 #include "automation/registry.h"
 #include "automation/server.h"
-#include "reportrt/output/registerruntime.h"
+#include "reportrt/viewer/registerruntime.h"
 
 #include <QApplication>
 #include <QByteArray>

@@ -7,7 +7,7 @@
 #include "mailcommand.h"
 #include "previewcommand.h"
 #include "printcommand.h"
-#include "reportrt/output/registerruntime.h"
+#include "reportrt/viewer/registerruntime.h"
 
 #include <QApplication>
 #include <QCommandLineParser>

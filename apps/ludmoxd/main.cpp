@@ -5,7 +5,7 @@
 #include "automation/server.h"
 #include "dialogcanceller.h"
 #include "ludmox/version.h"
-#include "reportrt/output/registerruntime.h"
+#include "reportrt/viewer/registerruntime.h"
 
 #include <QApplication>
 #include <QCommandLineParser>

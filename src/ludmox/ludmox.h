@@ -13,7 +13,7 @@
 #include "dialogs/inputboxparamsitem.h"
 #include "engine/moxengine115.h"
 #include "ludmox/version.h"
-#include "reportrt/output/registerruntime.h"
+#include "reportrt/viewer/registerruntime.h"
 #include "reports/moxevents115.h"
 #include "reports/moxreport115.h"
 #include "reports/moxreports115.h"

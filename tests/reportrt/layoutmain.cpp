@@ -1,4 +1,4 @@
-#include "reportrt/output/registerruntime.h"
+#include "reportrt/viewer/registerruntime.h"
 
 #include <QGuiApplication>
 #include <gtest/gtest.h>

@@ -1,7 +1,7 @@
 #include "core/comerror.h"
 #include "reportrt/data/odbcdrivers.h"
 #include "reportrt/data/providermap.h"
-#include "reportrt/output/registerruntime.h"
+#include "reportrt/viewer/registerruntime.h"
 #include "reportrtfixture.h"
 #include "runtime/application.h"
 #include "runtime/applicationfactory.h"

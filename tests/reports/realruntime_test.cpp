@@ -3,7 +3,7 @@
 
 #include "core/dictionary.h"
 #include "reportfixture.h"
-#include "reportrt/output/registerruntime.h"
+#include "reportrt/viewer/registerruntime.h"
 #include "runtime/applicationfactory.h"
 #include "runtime/report.h"
 #include "support/fulldisk.h"

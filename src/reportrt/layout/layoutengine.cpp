@@ -147,6 +147,9 @@ struct Layout {
     PageGeometry geometry;
     QDateTime printDate;
     int totalPages = 0;
+    // The records of the main report laid out, in print order: all, or one group's.
+    qsizetype firstPosition = 0;
+    qsizetype endPosition = -1; // -1: to the last record
 
     const LayoutEngine::PageSink* sink = nullptr;
     Pass* main = nullptr;
@@ -231,6 +234,7 @@ private:
     /// as long as no format handler may change it; nothing for other sections.
     std::optional<double> fixedHeight(const Section& section);
     void draw(const Prepared& prepared, double top);
+    void noteBand(const Section& section, double top, double height);
     void drawText(const Item& item, double left, double top);
     void layOutSubreports(const Instance& host, const Prepared& prepared, double top);
     QString text(const ReportObject& object);
@@ -266,7 +270,7 @@ void Layout::startPage()
     bodyBottom = geometry.height - geometry.bottom - main->pageFooterHeight();
     hasBody = false;
     pendingBreak = false;
-    if (pageNumber == 1)
+    if (pageNumber == 1 && endPosition < 0)
         main->placeReportHeader();
     main->placePageHeader();
 }
@@ -603,8 +607,10 @@ void Pass::place(const Instance& instance, double keepWithNext)
         m_layout.pendingBreak = false;
     }
     const double top = m_layout.y;
-    if (m_layout.drawing())
+    if (m_layout.drawing()) {
         draw(prepared, top);
+        noteBand(section, top, prepared.height);
+    }
     m_layout.y = top + prepared.height;
     if (prepared.height > 0)
         m_layout.hasBody = true;
@@ -626,9 +632,26 @@ void Pass::placeAt(const Instance& instance, double top)
         section.raiseFormat();
     }
     const Prepared prepared = prepare(instance);
-    if (m_layout.drawing())
+    if (m_layout.drawing()) {
         draw(prepared, top);
+        noteBand(section, top, prepared.height);
+    }
     m_layout.y = top + prepared.height;
+}
+
+void Pass::noteBand(const Section& section, double top, double height)
+{
+    if (!m_isMain || height <= 0)
+        return;
+    int node = -1;
+    const QString name = section.name();
+    if (name.startsWith(u"GH")) {
+        const auto level = static_cast<size_t>(name.mid(2).toInt());
+        if (level >= 1 && level <= m_groupAt.size())
+            node = m_groupAt[level - 1];
+    }
+    const double width = m_layout.geometry.width - m_layout.geometry.left - m_layout.geometry.right;
+    m_layout.page.bands.push_back({ QRectF(m_x, top, width, height), name, node });
 }
 
 void Pass::placePageHeader()
@@ -719,6 +742,10 @@ void Pass::run()
     m_lastPlaced = -1;
     if (!m_isMain && m_bands.reportHeader)
         place({ m_bands.reportHeader, m_result && m_result->size() > 0 ? 0 : -1 });
+    const qsizetype all = m_result ? m_result->size() : 0;
+    const bool restricted = m_isMain && m_layout.endPosition >= 0;
+    const qsizetype first = restricted ? m_layout.firstPosition : 0;
+    const qsizetype count = restricted ? std::min(all, m_layout.endPosition) : all;
 
     // Group nodes of each level in print order.
     std::vector<std::vector<int>> nodes(levels);
@@ -730,6 +757,16 @@ void Pass::run()
         }
     }
     std::vector<size_t> cursor(levels, 0);
+    // Laying out one group: the groups that end before it are passed over, and the groups
+    // around it, which started earlier, get neither header nor footer.
+    for (size_t l = 0; l < levels; ++l) {
+        while (cursor[l] < nodes[l].size()) {
+            const auto& node = m_result->groups[static_cast<size_t>(nodes[l][cursor[l]])];
+            if (node.firstRecord + node.recordCount > first)
+                break;
+            ++cursor[l];
+        }
+    }
     // A group header stays with the first detail of its group (and the headers between).
     std::vector<double> keepWith(levels, 0);
     double below = shownHeight(m_bands.detail);
@@ -738,8 +775,11 @@ void Pass::run()
         below += shownHeight(m_bands.groupHeaders[l]);
     }
 
-    const qsizetype count = m_result ? m_result->size() : 0;
-    for (qsizetype position = 0; position < count; ++position) {
+    const auto inside = [&](int index) {
+        const auto& node = m_result->groups[static_cast<size_t>(index)];
+        return node.firstRecord >= first && node.firstRecord + node.recordCount <= count;
+    };
+    for (qsizetype position = first; position < count; ++position) {
         m_next = position;
         for (size_t l = 0; l < levels; ++l) {
             if (cursor[l] >= nodes[l].size())
@@ -748,7 +788,7 @@ void Pass::run()
             if (m_result->groups[static_cast<size_t>(node)].firstRecord != position)
                 continue;
             m_groupAt[l] = node;
-            if (m_bands.groupHeaders[l])
+            if (m_bands.groupHeaders[l] && inside(node))
                 place({ m_bands.groupHeaders[l], position }, keepWith[l]);
         }
         if (m_bands.detail)
@@ -761,12 +801,12 @@ void Pass::run()
             const auto& node = m_result->groups[static_cast<size_t>(nodes[l][cursor[l]])];
             if (node.firstRecord + node.recordCount - 1 != position)
                 continue;
-            if (m_bands.groupFooters[l])
+            if (m_bands.groupFooters[l] && inside(nodes[l][cursor[l]]))
                 place({ m_bands.groupFooters[l], position });
             ++cursor[l];
         }
     }
-    if (m_bands.reportFooter)
+    if (m_bands.reportFooter && !restricted)
         place({ m_bands.reportFooter, count > 0 ? count - 1 : -1 });
     m_report.setCurrentRecord(-1);
 }
@@ -808,6 +848,15 @@ int LayoutEngine::run(const PageSink& sink)
                 .arg(qRound(g.height)));
     layout.printDate = m_printDate;
     layout.totalPages = m_totalPages;
+    if (m_groupNode >= 0) {
+        const RecordProcessor::Result* result = m_report.result();
+        if (!result || static_cast<size_t>(m_groupNode) >= result->groups.size())
+            raiseError(Error::RuntimeFailure,
+                QStringLiteral("The report has no group %1 to lay out.").arg(m_groupNode));
+        const auto& node = result->groups[static_cast<size_t>(m_groupNode)];
+        layout.firstPosition = node.firstRecord;
+        layout.endPosition = node.firstRecord + node.recordCount;
+    }
     layout.sink = &sink;
     Pass main(layout, m_report, layout.geometry.left, true);
     layout.main = &main;

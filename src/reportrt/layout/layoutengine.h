@@ -45,6 +45,12 @@ public:
     void setTotalPages(int count);
     /// The print date fields show; the current time by default.
     void setPrintDate(const QDateTime& dateTime);
+    /// Lays out only the records of one group node of the report's record result (an index
+    /// into RecordProcessor::Result::groups): that group's header, details and footer with
+    /// the page headers and footers, without the report header and footer, whose totals
+    /// cover every record. -1 (the default) lays out the whole report. A node the result
+    /// does not have raises Error::RuntimeFailure.
+    void setGroupNode(int node) { m_groupNode = node; }
 
     /// Lays every page out, handing each to sink in order; a null sink only counts pages
     /// (format events are raised all the same: handlers decide sizes). Reads the records
@@ -60,6 +66,7 @@ private:
     Report& m_report;
     TextShaper& m_shaper;
     int m_totalPages = 0;
+    int m_groupNode = -1;
     QDateTime m_printDate = QDateTime::currentDateTime();
 };
 

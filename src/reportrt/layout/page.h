@@ -7,6 +7,7 @@
 #include <QRectF>
 #include <QRgb>
 #include <QSizeF>
+#include <QString>
 #include <memory>
 #include <vector>
 
@@ -45,12 +46,21 @@ struct Page {
         QImage image;
     };
 
+    /// Where a section instance of the main report was placed, so a preview can tell what
+    /// lies under the mouse and which group a header opens.
+    struct Band {
+        QRectF rect;
+        QString section; // "GH1", "D", ...
+        int groupNode = -1; // the header's node in the record result; -1 for other sections
+    };
+
     int number = 0; // 1-based
     QSizeF size; // twips
     std::vector<Box> boxes;
     std::vector<Picture> pictures;
     std::vector<Line> lines;
     std::vector<Text> texts;
+    std::vector<Band> bands;
 
     bool isEmpty() const
     {

@@ -13,6 +13,7 @@ int Pagination::countPages()
     if (!m_total) {
         LayoutEngine counter(m_report, m_shaper);
         counter.setPrintDate(m_printDate);
+        counter.setGroupNode(m_groupNode);
         m_total = counter.run({});
     }
     return *m_total;
@@ -22,6 +23,7 @@ int Pagination::run(const LayoutEngine::PageSink& sink)
 {
     LayoutEngine engine(m_report, m_shaper);
     engine.setPrintDate(m_printDate);
+    engine.setGroupNode(m_groupNode);
     engine.setTotalPages(m_showsTotalPages ? countPages() : 0);
     return engine.run(sink);
 }

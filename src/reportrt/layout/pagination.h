@@ -31,6 +31,12 @@ public:
     int countPages();
     /// Forgets the count, for when the paper changed: other paper gives other pages.
     void forgetCount() { m_total.reset(); }
+    /// Restricts every pass to one group node (LayoutEngine::setGroupNode); -1 for all.
+    void setGroupNode(int node)
+    {
+        m_groupNode = node;
+        m_total.reset();
+    }
 
     /// Lays every page out, handing each to sink in order, and returns the number of
     /// pages. Reads the records first when the report has not read them; raises the
@@ -44,6 +50,7 @@ private:
     QDateTime m_printDate = QDateTime::currentDateTime();
     bool m_showsTotalPages;
     std::optional<int> m_total;
+    int m_groupNode = -1;
 };
 
 } // namespace reportrt

@@ -119,7 +119,7 @@ platform::PrintSettings ReportPrinter::settingsFor(const Report& report)
 }
 
 void ReportPrinter::printOut(Report& report, bool promptUser, int16_t copies, bool collated,
-    std::optional<runtime::PageRange> pages)
+    std::optional<runtime::PageRange> pages, int groupNode)
 {
     if (!report.result())
         report.readRecords();
@@ -136,6 +136,7 @@ void ReportPrinter::printOut(Report& report, bool promptUser, int16_t copies, bo
     int count = std::max<int>(1, copies);
 
     Pagination pagination(report);
+    pagination.setGroupNode(groupNode);
     const int totalPages = promptUser ? pagination.countPages() : 0;
 
     platform::PrinterInfo printer = printerFor(report);

@@ -33,8 +33,12 @@ public:
     /// Raises Error::RuntimeFailure for an empty page range or one that starts after the
     /// last page (nothing is printed), platform errors 482 and 75 when the printer cannot
     /// print, and the report's own errors from layout; a failed job publishes no file.
+    ///
+    /// groupNode other than -1 prints only that group of the record result, as a preview's
+    /// drill-down view shows it (LayoutEngine::setGroupNode); page numbers and ranges then
+    /// count that group's pages.
     static void printOut(Report& report, bool promptUser, int16_t copies, bool collated,
-        std::optional<runtime::PageRange> pages);
+        std::optional<runtime::PageRange> pages, int groupNode = -1);
 
     /// Shows the print set-up dialog for the report over parentWindow (or the report's
     /// dialog parent window when 0); the printer, orientation, paper size, paper source and

@@ -1,4 +1,4 @@
-#include "reportrt/output/registerruntime.h"
+#include "reportrt/viewer/registerruntime.h"
 
 #include "reportrt/application.h"
 #include "reportrt/base/reportoutput.h"
@@ -9,7 +9,9 @@
 #include "reportrt/output/reportprinter.h"
 #include "reportrt/output/writertable.h"
 #include "reportrt/output/xlsxexporter.h"
+#include "reportrt/viewer/reportviewer.h"
 #include "runtime/applicationfactory.h"
+#include "runtime/viewercontrolfactory.h"
 
 namespace reportrt {
 
@@ -52,6 +54,9 @@ void registerRuntime()
                 report, options, path.isEmpty() ? options.htmlFileName() : path);
         });
     ReportOutput::install(std::make_unique<RuntimeOutput>());
+    runtime::ViewerControlFactory::install([]() -> std::unique_ptr<runtime::ViewerControl> {
+        return std::make_unique<ReportViewer>();
+    });
     runtime::ApplicationFactory::install([]() -> std::shared_ptr<runtime::Application> {
         static std::weak_ptr<Application> current;
         auto application = current.lock();
