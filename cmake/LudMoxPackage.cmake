@@ -45,7 +45,7 @@ ludmox_add_shared_library(ludmox_reportrt_shared ludmoxreportrt ReportRT
         PRIVATE Qt6::Sql CURL::libcurl PkgConfig::XLSXWRITER PkgConfig::ODBC)
 ludmox_add_shared_library(ludmox_shared ludmox LudMox
     LIBRARIES ${LUDMOX_COMPONENT_OBJECT_LIBRARIES}
-    LINK PUBLIC ludmox_reportrt_shared Qt6::Widgets)
+    LINK PUBLIC ludmox_reportrt_shared Qt6::Widgets PRIVATE PkgConfig::XCB)
 
 # Headers a host includes, and the headers they include; nothing private.
 set(LUDMOX_PUBLIC_HEADERS

@@ -14,7 +14,7 @@ packages=(
     libreoffice-calc-nogui chromium
     postgresql postgresql-client
     unixodbc unixodbc-dev odbc-postgresql tdsodbc
-    fonts-dejavu-core xvfb xauth python3-tk imagemagick x11-apps
+    fonts-dejavu-core xvfb xauth python3-tk imagemagick x11-apps xdotool x11-utils python3-pil libxcb1-dev
     cups cups-bsd cups-client printer-driver-cups-pdf
     help2man man-db
 )

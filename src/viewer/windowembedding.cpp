@@ -6,6 +6,8 @@
 #include <QApplication>
 #include <QGuiApplication>
 #include <QWidget>
+#include <cstdlib>
+#include <xcb/xcb.h>
 
 namespace viewer {
 
@@ -26,6 +28,23 @@ int32_t toHandle(WId id)
 bool canReachForeignWindows()
 {
     return QGuiApplication::platformName() == QLatin1String("xcb");
+}
+
+// Whether the X server knows a window of that id (of any process); a widget moved into an
+// id that names none would be lost.
+bool isX11Window(WId id)
+{
+    const auto* x11 = qGuiApp->nativeInterface<QNativeInterface::QX11Application>();
+    xcb_connection_t* connection = x11 ? x11->connection() : nullptr;
+    if (!connection)
+        return false;
+    xcb_generic_error_t* error = nullptr;
+    xcb_get_geometry_reply_t* reply = xcb_get_geometry_reply(
+        connection, xcb_get_geometry(connection, static_cast<xcb_drawable_t>(id)), &error);
+    const bool found = reply && !error;
+    std::free(reply);
+    std::free(error);
+    return found;
 }
 
 } // namespace
@@ -65,14 +84,13 @@ bool WindowEmbedding::embed(QWidget* widget, int32_t parent)
         qCWarning(lcViewer) << "window" << parent << "is not a window this process can reach";
         return false;
     }
-    QWindow* foreign = QWindow::fromWinId(toWId(parent));
-    // A foreign window of an id that names no window has no size: X11 answered nothing
-    // for it, and a widget moved into it would be lost.
-    if (!foreign || foreign->geometry().isEmpty()) {
-        delete foreign;
+    if (!isX11Window(toWId(parent))) {
         qCWarning(lcViewer) << "window" << parent << "is no window this process can reach";
         return false;
     }
+    QWindow* foreign = QWindow::fromWinId(toWId(parent));
+    if (!foreign)
+        return false;
     delete m_foreign.data();
     m_foreign = foreign;
     // A top-level widget of its own, whose native window then moves into the host's.
@@ -81,6 +99,7 @@ bool WindowEmbedding::embed(QWidget* widget, int32_t parent)
     widget->windowHandle()->setParent(foreign);
     widget->move(0, 0);
     widget->show();
+    widget->windowHandle()->requestActivate();
     m_embedded = true;
     return true;
 }

@@ -10,10 +10,12 @@ Run by CTest with LUDMOX_LUDMOXD, LUDMOX_EXAMPLES and PYTHONPATH set.
 """
 
 import os
+import re
 import shutil
 import subprocess
 import sys
 import tempfile
+import time
 import unittest
 
 SKIP = 77
@@ -31,9 +33,14 @@ if not os.environ.get("DISPLAY"):
 
 try:
     import tkinter
+    from PIL import Image
 except ImportError:
-    print("skipped: Tk is not installed (python3-tk)", file=sys.stderr)
+    print("skipped: Tk or PIL is not installed (python3-tk, python3-pil)", file=sys.stderr)
     sys.exit(SKIP)
+for tool in ("import", "xdotool", "xwininfo", "pdftoppm"):
+    if not shutil.which(tool):
+        print(f"skipped: {tool} is not installed", file=sys.stderr)
+        sys.exit(SKIP)
 
 from ludmox import Client, ComError  # noqa: E402
 
@@ -42,14 +49,27 @@ os.environ["QT_QPA_PLATFORM"] = "xcb"
 
 
 def screenshot(window_id, path):
-    """The host window as an image file, by ImageMagick's import or xwd."""
-    if shutil.which("import"):
-        command = ["import", "-window", str(window_id), path]
-    elif shutil.which("xwd"):
-        command = ["xwd", "-id", str(window_id), "-out", path]
-    else:
-        return False
-    return subprocess.run(command, check=False).returncode == 0
+    """The host window as a PNG, by ImageMagick's import."""
+    return subprocess.run(["import", "-window", str(window_id), path],
+                          check=False).returncode == 0
+
+
+def xdotool(*arguments):
+    subprocess.run(["xdotool", *arguments], check=True)
+
+
+def best_match(screen, reference, search):
+    """The smallest mean difference of reference placed anywhere within search (x, y)
+    pixels of the screen's corner, and where."""
+    from PIL import ImageChops, ImageStat
+    best = (256.0, None)
+    for y in range(0, search[1], 2):
+        for x in range(0, search[0], 2):
+            window = screen.crop((x, y, x + reference.width, y + reference.height))
+            score = ImageStat.Stat(ImageChops.difference(window, reference)).mean[0]
+            if score < best[0]:
+                best = (score, (x, y))
+    return best
 
 
 class TkHostTest(unittest.TestCase):
@@ -73,10 +93,13 @@ class TkHostTest(unittest.TestCase):
         self.addCleanup(self.mox.close)
 
     def pump(self, rounds=20):
-        """Lets both windows draw: Tk's loop here, the server's between calls."""
+        """Lets both windows draw and take input: Tk's loop here, the server's between
+        calls (each a real round trip, during which the host answers the viewer's events),
+        with time for the X server to pass input on."""
         for _ in range(rounds):
             self.root.update()
-            self.mox.typelib()
+            self.window.GetFHwnd()
+            time.sleep(0.02)
 
     def test_preview_inside_the_host_window(self):
         engine = self.mox.create("MoxEngine115")
@@ -84,13 +107,19 @@ class TkHostTest(unittest.TestCase):
         reports = engine.GetReports()
         report = reports.Item(self.report_path)
 
-        window = self.mox.create("clsMoxViewer115")
+        window = self.window = self.mox.create("clsMoxViewer115")
         seen = []
-        self.mox.on(window, "SearchButtonClicked",
-                    lambda event: (seen.append(("search", event.args[0])),
-                                   event.args.__setitem__(1, False)))
-        self.mox.on(window, "PrintButtonClicked",
-                    lambda event: (seen.append(("print",)), event.args.__setitem__(0, False)))
+
+        def on_search(event):
+            seen.append(("search", event.args[0]))
+            event.args[1] = False  # the host searches itself: the viewer must not
+
+        def on_print(event):
+            seen.append(("print",))
+            event.args[0] = False  # the host prints itself: no print dialog may open
+
+        self.mox.on(window, "SearchButtonClicked", on_search)
+        self.mox.on(window, "PrintButtonClicked", on_print)
         errors = []
         self.mox.on(window, "OnReportSourceError",
                     lambda event: errors.append(list(event.args)))
@@ -113,11 +142,60 @@ class TkHostTest(unittest.TestCase):
         self.pump()
         self.assertGreaterEqual(window.CRView.GetCurrentPageNumber(), 1)
 
-        # The lead completes these with the real viewer's toolbar (xdotool clicks on the
-        # search and print buttons); the host's answers then keep the viewer from acting.
+        # The host's window shows the report's first page as the PDF export draws it:
+        # the title and the column band, found near the top left of the host's frame.
         shot = os.path.join(self.folder.name, "host.png")
-        if screenshot(self.root.winfo_id(), shot):
-            self.assertGreater(os.path.getsize(shot), 0)
+        self.assertTrue(screenshot(self.frame.winfo_id(), shot))
+        pdf_folder = os.path.join(self.folder.name, "pdf")
+        subprocess.run([os.environ["LUDMOX_CLI"], "export", "--database", self.database,
+                        "--output", pdf_folder, self.report_path], check=True,
+                       stdout=subprocess.DEVNULL)
+        # The control's 100 % is the screen's 96 dots per inch.
+        subprocess.run(["pdftoppm", "-r", "96", "-f", "1", "-l", "1", "-png",
+                        os.path.join(pdf_folder, "orders-by-customer.pdf"),
+                        os.path.join(self.folder.name, "page")], check=True)
+        page = Image.open(os.path.join(self.folder.name, "page-01.png")).convert("L")
+        screen = Image.open(shot).convert("L")
+        # From the page's top-left margin: the title and the first header band.
+        reference = page.crop((48, 48, 48 + 480, 48 + 110))
+        score, where = best_match(screen, reference, (200, 160))
+        blank = best_match(screen.crop((0, 560, 880, 660)), reference.crop((0, 0, 480, 50)),
+                           (2, 2))[0]
+        self.assertLess(score, 12, f"the host window does not show the report ({where})")
+        self.assertGreater(blank, score * 2)
+
+        # Keys go to the window under the pointer (no window manager runs). A click on the
+        # blank margin of the page activates the embedded window, a second one (not so soon
+        # that it makes a double click, which would drill down) gives the pages the focus.
+        margin = (self.frame.winfo_rootx() + 70, self.frame.winfo_rooty() + 400)
+
+        # The server's window is the frame's child now.
+        tree = subprocess.run(["xwininfo", "-children", "-id", str(self.frame.winfo_id())],
+                              check=True, capture_output=True, text=True).stdout
+        self.assertEqual(len(re.findall(r"0x[0-9a-f]+ \"ludmoxd\"", tree)), 1, tree)
+
+        def click_margin():
+            xdotool("mousemove", str(margin[0]), str(margin[1]))
+            xdotool("click", "1")
+            self.pump(5)
+            time.sleep(0.6)
+            xdotool("click", "1")
+            self.pump(5)
+
+        click_margin()
+        xdotool("key", "ctrl+f")
+        self.pump(5)
+        xdotool("type", "Stockholm")
+        self.pump(5)
+        xdotool("key", "Return")
+        self.pump()
+        self.assertIn(("search", "Stockholm"), seen)
+        time.sleep(0.6)
+        click_margin()
+        xdotool("key", "ctrl+p")
+        self.pump()
+        self.assertIn(("print",), seen)
+        self.assertEqual(errors, [])
 
         window.Destroy()
         self.assertEqual(window.GetFHwnd(), 0)

@@ -53,6 +53,7 @@ constexpr int16_t keyHome = 36;
 constexpr int16_t keyUp = 38;
 constexpr int16_t keyDown = 40;
 constexpr int16_t keyF = 70;
+constexpr int16_t keyP = 80;
 constexpr int16_t keyF3 = 114;
 constexpr int16_t keyF5 = 116;
 constexpr int16_t shiftBit = 1;
@@ -995,6 +996,10 @@ void ReportViewer::onKey(QKeyEvent* event)
             m_searchBox->setFocus();
             m_searchBox->selectAll();
         }
+        break;
+    case keyP:
+        if (shift & ctrlBit)
+            onPrintButton();
         break;
     case keyF3:
         findNext(shift & shiftBit);
