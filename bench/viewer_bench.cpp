@@ -4,6 +4,7 @@
 //
 //   viewer_bench [--rows N] [--report FILE]
 
+#include "benchdatabase.h"
 #include "core/comerror.h"
 #include "core/variant.h"
 #include "reportrt/report.h"
@@ -27,79 +28,6 @@
 #include <cstdio>
 
 namespace {
-
-void fail(const QString& text)
-{
-    std::fprintf(stderr, "viewer_bench: %s\n", qPrintable(text));
-    std::exit(1);
-}
-
-/// Orders as the sample database has them, made quickly and always the same.
-void makeDatabase(const QString& path, int rows)
-{
-    static const char* const cities[][2] = { { "Tallinn", "Estonia" }, { "Tartu", "Estonia" },
-        { "Riga", "Latvia" }, { "Liepaja", "Latvia" }, { "Vilnius", "Lithuania" },
-        { "Kaunas", "Lithuania" }, { "Helsinki", "Finland" }, { "Turku", "Finland" },
-        { "Stockholm", "Sweden" }, { "Gothenburg", "Sweden" }, { "Hamburg", "Germany" },
-        { "Berlin", "Germany" }, { "Gdansk", "Poland" }, { "Oslo", "Norway" } };
-    static const char* const statuses[] = { "Shipped", "Shipped", "Invoiced", "Open" };
-    static const char* const people[]
-        = { "A. Tamm", "K. Saar", "J. Ozols", "L. Kalnina", "M. Berg", "E. Virtanen" };
-    const QString name = QStringLiteral("bench-setup");
-    {
-        QSqlDatabase db = QSqlDatabase::addDatabase(QStringLiteral("QSQLITE"), name);
-        db.setDatabaseName(path);
-        if (!db.open())
-            fail(db.lastError().text());
-        QSqlQuery query(db);
-        query.exec(QStringLiteral("PRAGMA journal_mode = OFF"));
-        query.exec(QStringLiteral("PRAGMA synchronous = OFF"));
-        if (!query.exec(QStringLiteral(
-                "CREATE TABLE Orders (OrderID INTEGER PRIMARY KEY, CustomerID INTEGER, "
-                "OrderDate TEXT, ShipDate TEXT, Status TEXT, ShipCity TEXT, ShipCountry TEXT, "
-                "Salesperson TEXT, Items INTEGER, Amount NUMERIC, Freight NUMERIC)")))
-            fail(query.lastError().text());
-        QRandomGenerator random(20261206);
-        const QDate start(2020, 1, 1);
-        db.transaction();
-        query.prepare(QStringLiteral("INSERT INTO Orders VALUES (?,?,?,?,?,?,?,?,?,?,?)"));
-        for (int id = 1; id <= rows; ++id) {
-            const auto& city = cities[random.bounded(14)];
-            const QDate day = start.addDays(static_cast<qint64>(id) * 2000 / rows);
-            const char* status = statuses[random.bounded(4)];
-            query.addBindValue(id);
-            query.addBindValue(random.bounded(1, 5000));
-            query.addBindValue(day.toString(Qt::ISODate));
-            query.addBindValue(qstrcmp(status, "Open") == 0
-                    ? QVariant()
-                    : QVariant(day.addDays(random.bounded(1, 9)).toString(Qt::ISODate)));
-            query.addBindValue(QString::fromLatin1(status));
-            query.addBindValue(QString::fromLatin1(city[0]));
-            query.addBindValue(QString::fromLatin1(city[1]));
-            query.addBindValue(QString::fromLatin1(people[random.bounded(6)]));
-            query.addBindValue(random.bounded(1, 120));
-            query.addBindValue(random.bounded(100, 5000000) / 100.0);
-            query.addBindValue(random.bounded(500, 8000) / 100.0);
-            if (!query.exec())
-                fail(query.lastError().text());
-        }
-        db.commit();
-        db.close();
-    }
-    QSqlDatabase::removeDatabase(name);
-}
-
-void relocate(runtime::Report& report, const QString& database)
-{
-    for (const auto& table : report.databaseTables()) {
-        table->deleteConnectionProperties();
-        table->addConnectionProperty(
-            QStringLiteral("Provider"), core::Variant(QStringLiteral("Microsoft.Jet.OLEDB.4.0")));
-        table->addConnectionProperty(QStringLiteral("Data Source"), core::Variant(database));
-        const QString location = table->location();
-        table->setLocation(location.mid(location.lastIndexOf(u'.') + 1), QString(), QString());
-    }
-}
 
 double milliseconds(const QElapsedTimer& timer)
 {
@@ -126,10 +54,10 @@ int main(int argc, char* argv[])
     bool ok = false;
     const int rows = parser.value(QStringLiteral("rows")).toInt(&ok);
     if (!ok || rows < 1)
-        fail(QStringLiteral("--rows takes a positive number"));
+        bench::fail(QStringLiteral("--rows takes a positive number"));
     QTemporaryDir scratch;
     const QString database = scratch.filePath(QStringLiteral("bench.db"));
-    makeDatabase(database, rows);
+    bench::makeDatabase(database, rows);
     const QString file = parser.value(QStringLiteral("report"));
 
     try {
@@ -137,7 +65,7 @@ int main(int argc, char* argv[])
         QElapsedTimer timer;
         timer.start();
         auto reading = reportrt::Report::open(file);
-        relocate(*reading, database);
+        bench::relocate(*reading, database);
         reading->readRecords();
         const double read = milliseconds(timer);
         reading.reset();
@@ -146,7 +74,7 @@ int main(int argc, char* argv[])
         viewer.widget()->resize(1200, 900);
         viewer.widget()->show();
         auto report = reportrt::Report::open(file);
-        relocate(*report, database);
+        bench::relocate(*report, database);
         double firstPage = -1;
         QTimer probe;
         QObject::connect(&probe, &QTimer::timeout, [&] {
@@ -164,7 +92,7 @@ int main(int argc, char* argv[])
         const double complete = milliseconds(timer);
         probe.stop();
         if (viewer.layoutState() != runtime::ViewerControl::LayoutState::Complete)
-            fail(QStringLiteral("the layout did not complete"));
+            bench::fail(QStringLiteral("the layout did not complete"));
 
         viewer.setZoom(100);
         const int pages = viewer.pageCount();
@@ -191,7 +119,7 @@ int main(int argc, char* argv[])
         std::printf("flip a page (mean/max)  %9.1f / %.1f ms\n", flipTotal / flips, flipWorst);
         std::printf("search (%d hits)  %9.1f ms\n", hits, search);
     } catch (const core::ComError& error) {
-        fail(error.description());
+        bench::fail(error.description());
     }
     return 0;
 }
