@@ -42,7 +42,7 @@ endfunction()
 ludmox_add_shared_library(ludmox_reportrt_shared ludmoxreportrt ReportRT
     LIBRARIES ${LUDMOX_REPORTRT_OBJECT_LIBRARIES}
     LINK PUBLIC Qt6::Core Qt6::Gui Qt6::Widgets Qt6::PrintSupport
-        PRIVATE Qt6::Sql CURL::libcurl PkgConfig::XLSXWRITER PkgConfig::ODBC)
+        PRIVATE Qt6::Sql CURL::libcurl PkgConfig::XLSXWRITER PkgConfig::ODBC SQLite::SQLite3)
 ludmox_add_shared_library(ludmox_shared ludmox LudMox
     LIBRARIES ${LUDMOX_COMPONENT_OBJECT_LIBRARIES}
     LINK PUBLIC ludmox_reportrt_shared Qt6::Widgets PRIVATE PkgConfig::XCB)

@@ -5,9 +5,11 @@
 #include "reportrt/formula/formulaevaluator.h"
 
 #include <QSet>
+#include <QSqlDriver>
 #include <QSqlError>
 #include <QSqlQuery>
 #include <QSqlRecord>
+#include <sqlite3.h>
 
 namespace reportrt {
 
@@ -168,14 +170,113 @@ std::optional<Value> RecordReader::convert(const QVariant& value, ValueType type
     return std::nullopt;
 }
 
-RecordReader::Result RecordReader::read(const Request& request)
+namespace {
+// Rows of a statement through Qt's SQL interface: any driver.
+class QtRows {
+public:
+    QtRows(const QSqlDatabase& database, const QString& sql)
+        : m_query(database)
+    {
+        m_query.setForwardOnly(true);
+        if (!m_query.exec(sql))
+            serverError(m_query.lastError().text());
+        m_layout = m_query.record();
+    }
+    int columnCount() const { return m_layout.count(); }
+    QString columnName(int column) const { return m_layout.fieldName(column); }
+    bool next()
+    {
+        if (m_query.next())
+            return true;
+        if (m_query.lastError().isValid())
+            serverError(m_query.lastError().text());
+        return false;
+    }
+    QVariant value(int column) const { return m_query.value(column); }
+
+private:
+    QSqlQuery m_query;
+    QSqlRecord m_layout;
+};
+
+// Rows of a SQLite connection straight from SQLite: the values Qt's driver would give
+// (integers, doubles, text, blobs, Null), without its cache of variants for every row,
+// which costs more than SQLite itself.
+class SqliteRows {
+public:
+    SqliteRows(sqlite3* database, const QString& sql)
+        : m_database(database)
+    {
+        if (sqlite3_prepare16_v2(
+                database, sql.utf16(), static_cast<int>(sql.size() * 2), &m_statement, nullptr)
+            != SQLITE_OK)
+            fail();
+        if (!m_statement)
+            serverError(QStringLiteral("the statement is empty"));
+    }
+    ~SqliteRows() { sqlite3_finalize(m_statement); }
+    SqliteRows(const SqliteRows&) = delete;
+    SqliteRows& operator=(const SqliteRows&) = delete;
+
+    int columnCount() const { return sqlite3_column_count(m_statement); }
+    // As Qt's driver names them: without quotes and without a table in front.
+    QString columnName(int column) const
+    {
+        QString name = QString::fromUtf8(sqlite3_column_name(m_statement, column));
+        name.remove(u'"');
+        return name.mid(name.lastIndexOf(u'.') + 1);
+    }
+    bool next()
+    {
+        const int result = sqlite3_step(m_statement);
+        if (result == SQLITE_ROW)
+            return true;
+        if (result != SQLITE_DONE)
+            fail();
+        return false;
+    }
+    QVariant value(int column) const
+    {
+        switch (sqlite3_column_type(m_statement, column)) {
+        case SQLITE_INTEGER:
+            return QVariant(static_cast<qlonglong>(sqlite3_column_int64(m_statement, column)));
+        case SQLITE_FLOAT:
+            return QVariant(sqlite3_column_double(m_statement, column));
+        case SQLITE_NULL:
+            return QVariant();
+        case SQLITE_BLOB:
+            return QVariant(
+                QByteArray(static_cast<const char*>(sqlite3_column_blob(m_statement, column)),
+                    sqlite3_column_bytes(m_statement, column)));
+        default:
+            return QVariant(QString::fromUtf8(
+                reinterpret_cast<const char*>(sqlite3_column_text(m_statement, column)),
+                sqlite3_column_bytes(m_statement, column)));
+        }
+    }
+
+private:
+    [[noreturn]] void fail() const { serverError(QString::fromUtf8(sqlite3_errmsg(m_database))); }
+
+    sqlite3* m_database;
+    sqlite3_stmt* m_statement = nullptr;
+};
+
+// The connection's own SQLite handle when Qt's SQLite driver serves it.
+sqlite3* sqliteHandle(const QSqlDatabase& database)
 {
-    Result result { RecordSet(static_cast<int>(request.columns.size())), 0 };
-    QSqlQuery query(request.database);
-    query.setForwardOnly(true);
-    if (!query.exec(request.sql))
-        serverError(query.lastError().text());
-    const QSqlRecord layout = query.record();
+    if (!database.driver() || database.driverName() != u"QSQLITE")
+        return nullptr;
+    const QVariant handle = database.driver()->handle();
+    if (!handle.isValid() || qstrcmp(handle.typeName(), "sqlite3*") != 0)
+        return nullptr;
+    return *static_cast<sqlite3* const*>(handle.constData());
+}
+
+template <typename Rows>
+RecordReader::Result readRows(Rows& rows, const RecordReader::Request& request)
+{
+    RecordReader::Result result { RecordSet(static_cast<int>(request.columns.size())), 0 };
     const int columnCount = static_cast<int>(request.columns.size());
     std::vector<int> source(request.columns.size());
     for (int i = 0; i < columnCount; ++i) {
@@ -183,19 +284,19 @@ RecordReader::Result RecordReader::read(const Request& request)
             const QString& name = request.columns[static_cast<size_t>(i)].name;
             const QString bare = name.mid(name.lastIndexOf(u'.') + 1);
             int found = -1;
-            for (int k = 0; k < layout.count() && found < 0; ++k) {
-                if (layout.fieldName(k).compare(bare, Qt::CaseInsensitive) == 0
-                    || layout.fieldName(k).compare(name, Qt::CaseInsensitive) == 0)
+            for (int k = 0; k < rows.columnCount() && found < 0; ++k) {
+                if (rows.columnName(k).compare(bare, Qt::CaseInsensitive) == 0
+                    || rows.columnName(k).compare(name, Qt::CaseInsensitive) == 0)
                     found = k;
             }
             if (found < 0)
                 serverError(QStringLiteral("the statement has no column %1").arg(bare));
             source[static_cast<size_t>(i)] = found;
         } else {
-            if (i >= layout.count())
+            if (i >= rows.columnCount())
                 serverError(QStringLiteral(
                     "the statement gives %1 columns; the report reads %2 (%3 is missing)")
-                                .arg(layout.count())
+                                .arg(rows.columnCount())
                                 .arg(columnCount)
                                 .arg(request.columns[static_cast<size_t>(i)].name));
             source[static_cast<size_t>(i)] = i;
@@ -207,11 +308,11 @@ RecordReader::Result RecordReader::read(const Request& request)
     constexpr qsizetype sharedTextLimit = 4096;
     std::vector<QSet<QString>> sharedTexts(static_cast<size_t>(columnCount));
     qsizetype index = 0;
-    while (query.next()) {
+    while (rows.next()) {
         Value* record = result.records.append();
         for (int i = 0; i < columnCount; ++i) {
-            const QVariant v = query.value(source[static_cast<size_t>(i)]);
-            auto converted = convert(v, request.columns[static_cast<size_t>(i)].type);
+            const QVariant v = rows.value(source[static_cast<size_t>(i)]);
+            auto converted = RecordReader::convert(v, request.columns[static_cast<size_t>(i)].type);
             if (converted && converted->type() == ValueType::String) {
                 QSet<QString>& shared = sharedTexts[static_cast<size_t>(i)];
                 if (shared.size() < sharedTextLimit) {
@@ -234,11 +335,20 @@ RecordReader::Result RecordReader::read(const Request& request)
             result.records.removeLast();
         ++index;
     }
-    if (query.lastError().isValid())
-        serverError(query.lastError().text());
     result.recordsRead = static_cast<int>(std::min<qsizetype>(index, INT32_MAX));
     result.records.shrinkToFit();
     return result;
+}
+} // namespace
+
+RecordReader::Result RecordReader::read(const Request& request)
+{
+    if (sqlite3* handle = sqliteHandle(request.database)) {
+        SqliteRows rows(handle, request.sql);
+        return readRows(rows, request);
+    }
+    QtRows rows(request.database, request.sql);
+    return readRows(rows, request);
 }
 
 RecordSet RecordReader::select(const RecordSet& records,
