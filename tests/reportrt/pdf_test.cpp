@@ -10,6 +10,9 @@
 #include <QBuffer>
 #include <QDir>
 #include <QFile>
+#include <QFont>
+#include <QFontInfo>
+#include <QRawFont>
 #include <QRegularExpression>
 #include <gtest/gtest.h>
 
@@ -369,6 +372,76 @@ TEST(PdfExport, AFormatHandlerChangesOnlyItsRecordsPage)
             EXPECT_LT(coverage(image, widened, Qt::blue), 0.05) << "page " << page;
         }
     }
+}
+
+// One report header holding a text in the given font, over a one-record Items table.
+std::shared_ptr<Report> textReport(
+    const QTemporaryDir& dir, const QString& text, const QString& family)
+{
+    QJsonObject object = textObject(text, 0, 0, 9000, 400);
+    object.insert(u"font"_s, QJsonObject { { u"family"_s, family }, { u"size"_s, 12 } });
+    const QJsonObject document = itemsReport({ section(u"RH"_s, 600, { object }) });
+    return openReport(writeReport(dir, document), itemsDatabase(dir, 1));
+}
+
+TEST(PdfWriter, EmbedsEachFaceOnceAsASubsetWhateverItsSizes)
+{
+    auto report = openExample(u"orders-by-customer.rpt"_s);
+    QTemporaryDir dir;
+    const QString path = dir.filePath(u"out.pdf"_s);
+    exportPdf(*report, path);
+    // The report uses DejaVu Sans at several sizes, bold and regular: two faces.
+    QStringList names;
+    for (const QString& line : pdfFonts(path).split(u'\n', Qt::SkipEmptyParts).mid(2)) {
+        const QStringList columns = line.simplified().split(u' ');
+        ASSERT_GE(columns.size(), 7) << line.toStdString();
+        EXPECT_TRUE(line.contains(u" yes yes yes "_s)) << line.toStdString(); // emb sub uni
+        EXPECT_EQ(columns.front().indexOf(u'+'), 6) << line.toStdString(); // a subset tag
+        names << columns.front().mid(7);
+    }
+    names.sort();
+    EXPECT_EQ(names, (QStringList { u"DejaVuSans"_s, u"DejaVuSans-Bold"_s }));
+}
+
+TEST(PdfWriter, TextThatShapingChangedExtractsAsItReads)
+{
+    // A decomposed accent, a ligature and Greek take the shaper's complex path, where
+    // glyphs and characters no longer pair up one to one.
+    const QString text = u"Caf\u0065\u0301 \uFB01ne \u03A9\u03BC\u03AD\u03B3\u03B1 na\u00EFve"_s;
+    QTemporaryDir dir;
+    auto report = textReport(dir, text, u"DejaVu Sans"_s);
+    const QString path = dir.filePath(u"out.pdf"_s);
+    exportPdf(*report, path);
+    EXPECT_TRUE(qpdfCheck(path));
+    const QString extracted = pdfText(path).normalized(QString::NormalizationForm_KC).simplified();
+    EXPECT_EQ(extracted, text.normalized(QString::NormalizationForm_KC)) << extracted.toStdString();
+}
+
+TEST(PdfWriter, FacesOfOtherFormatsAreEmbeddedToo)
+{
+    // The URW faces (fonts-urw-base35) come as Type 1 and as OpenType with PostScript
+    // outlines: drawn from outlines or embedded whole, the text must show and extract.
+    if (!QFontInfo(QFont(u"Nimbus Sans"_s)).family().startsWith(u"Nimbus Sans"_s))
+        GTEST_SKIP() << "Nimbus Sans is not installed";
+    QTemporaryDir dir;
+    auto report = textReport(dir, u"Quarterly totals 2026"_s, u"Nimbus Sans"_s);
+    const QString path = dir.filePath(u"out.pdf"_s);
+    exportPdf(*report, path);
+    EXPECT_TRUE(qpdfCheck(path));
+    const QString fonts = pdfFonts(path);
+    const QStringList lines = fonts.split(u'\n', Qt::SkipEmptyParts).mid(2);
+    ASSERT_FALSE(lines.isEmpty());
+    for (const QString& line : lines)
+        EXPECT_TRUE(line.contains(u" yes "_s)) << line.toStdString();
+    EXPECT_EQ(pdfText(path).simplified(), u"Quarterly totals 2026"_s);
+    // Drawn with what was embedded: the rendering has ink where the title is.
+    const QImage page = renderPdfPage(path, 1, 72);
+    int dark = 0;
+    for (int y = 30; y < 60; ++y) {
+        for (int x = 30; x < 250; ++x)
+            dark += qGray(page.pixel(x, y)) < 128;
+    }
+    EXPECT_GT(dark, 100);
 }
 
 } // namespace

@@ -106,6 +106,13 @@ void addComponents(const QByteArray& glyph, std::vector<uint32_t>& pending)
 }
 } // namespace
 
+bool FontProgram::canEmbed(const QRawFont& font)
+{
+    return font.isValid() && font.fontTable("head").size() >= 54
+        && font.fontTable("hhea").size() >= 36 && font.fontTable("maxp").size() >= 6
+        && !font.fontTable("glyf").isEmpty() && !font.fontTable("loca").isEmpty();
+}
+
 FontProgram FontProgram::make(const QRawFont& font, std::vector<bool> used)
 {
     FontProgram program;
@@ -128,21 +135,8 @@ FontProgram FontProgram::make(const QRawFont& font, std::vector<bool> used)
 
     const QByteArray glyf = font.fontTable("glyf");
     const QByteArray loca = font.fontTable("loca");
-    if (glyf.isEmpty() || loca.isEmpty()) {
-        // PostScript outlines: the whole program, as the tables a reader needs.
-        std::map<QByteArray, QByteArray> tables;
-        for (const char* tag :
-            { "CFF ", "cmap", "head", "hhea", "hmtx", "maxp", "name", "OS/2", "post" }) {
-            const QByteArray table = font.fontTable(tag);
-            if (!table.isEmpty())
-                tables.emplace(QByteArray(tag), table);
-        }
-        if (!tables.count("CFF "))
-            return program;
-        program.m_bytes = assemble(0x4F54544F, tables); // "OTTO"
-        program.m_kind = Kind::OpenType;
+    if (glyf.isEmpty() || loca.isEmpty())
         return program;
-    }
 
     const bool longOffsets = s16(head, 50) == 1;
     const auto offsetOf = [&](uint32_t g) -> qsizetype {

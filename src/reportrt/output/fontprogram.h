@@ -10,12 +10,14 @@ namespace reportrt {
 ///
 /// A TrueType face is cut down to the glyphs a document uses (and the parts of composite
 /// glyphs they are made of): the other glyphs keep their numbers but lose their outlines,
-/// so glyph numbers written in the pages stay valid and the file stays small. A face with
-/// PostScript outlines is embedded whole, as an OpenType program.
+/// so glyph numbers written in the pages stay valid and the file stays small. Faces of
+/// other kinds give no program (the writer draws them from their outlines).
 class FontProgram {
 public:
-    enum class Kind { None, TrueType, OpenType };
+    enum class Kind { None, TrueType };
 
+    /// Whether make() gives a program for the face: one with TrueType outlines.
+    static bool canEmbed(const QRawFont& font);
     /// used[g] says whether glyph g is drawn; glyph 0 is always kept.
     static FontProgram make(const QRawFont& font, std::vector<bool> used);
 

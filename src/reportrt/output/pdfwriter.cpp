@@ -7,6 +7,7 @@
 #include <QDateTime>
 #include <QHash>
 #include <QIODevice>
+#include <QPainterPath>
 #include <QRawFont>
 #include <algorithm>
 #include <charconv>
@@ -46,6 +47,13 @@ void appendHex4(QByteArray& out, uint32_t value)
     const char hex[4] = { digits[(value >> 12) & 15], digits[(value >> 8) & 15],
         digits[(value >> 4) & 15], digits[value & 15] };
     out.append(hex, 4);
+}
+
+void appendHex2(QByteArray& out, uint32_t value)
+{
+    static const char digits[] = "0123456789ABCDEF";
+    const char hex[2] = { digits[(value >> 4) & 15], digits[value & 15] };
+    out.append(hex, 2);
 }
 
 void appendColor(QByteArray& out, QRgb color, const char* op)
@@ -93,11 +101,80 @@ QByteArray postScriptName(const FontFace& face)
     return name.isEmpty() ? QByteArray("Font") : name;
 }
 
+// A ToUnicode map of codes of digits hex digits to the text they show.
+QByteArray toUnicodeMap(const std::map<uint32_t, QString>& byCode, int digits)
+{
+    QByteArray cmap = "/CIDInit /ProcSet findresource begin\n12 dict begin\nbegincmap\n"
+                      "/CIDSystemInfo << /Registry (Adobe) /Ordering (UCS) /Supplement 0 >> def\n"
+                      "/CMapName /Adobe-Identity-UCS def\n/CMapType 2 def\n1 begincodespacerange\n";
+    cmap += digits == 2 ? "<00> <FF>\n" : "<0000> <FFFF>\n";
+    cmap += "endcodespacerange\n";
+    auto entry = byCode.begin();
+    while (entry != byCode.end()) {
+        QByteArray block;
+        int n = 0;
+        for (; entry != byCode.end() && n < 100; ++entry, ++n) {
+            block.append('<');
+            if (digits == 2)
+                appendHex2(block, entry->first);
+            else
+                appendHex4(block, entry->first);
+            block.append("> <");
+            for (const QChar ch : entry->second)
+                appendHex4(block, ch.unicode());
+            block.append(">\n");
+        }
+        cmap += QByteArray::number(n) + " beginbfchar\n" + block + "endbfchar\n";
+    }
+    cmap += "endcmap\nCMapName currentdict /CMap defineresource pop\nend\nend\n";
+    return cmap;
+}
+
+// A glyph's outline as PDF path operators in glyph space (1000 units to the em, y up).
+QByteArray outlineOperators(const QPainterPath& path)
+{
+    QByteArray out;
+    for (int i = 0; i < path.elementCount(); ++i) {
+        const QPainterPath::Element e = path.elementAt(i);
+        const auto point = [&out](const QPainterPath::Element& p) {
+            appendNumber(out, p.x);
+            out.append(' ');
+            appendNumber(out, -p.y);
+            out.append(' ');
+        };
+        if (e.isMoveTo()) {
+            if (i > 0)
+                out.append("h\n");
+            point(e);
+            out.append("m\n");
+        } else if (e.isLineTo()) {
+            point(e);
+            out.append("l\n");
+        } else if (e.isCurveTo() && i + 2 < path.elementCount()) {
+            point(e);
+            point(path.elementAt(i + 1));
+            point(path.elementAt(i + 2));
+            out.append("c\n");
+            i += 2;
+        }
+    }
+    if (!out.isEmpty())
+        out.append("h f\n");
+    return out;
+}
+
 struct UsedFont {
+    bool known = false;
     int object = 0; // the Type0 font
     std::vector<bool> glyphs;
     std::map<uint32_t, QString> text; // what each glyph shows, for the ToUnicode map
     bool needsReverseMap = false;
+    // A face whose program cannot be embedded (a Type 1 face, say) is drawn from its glyph
+    // outlines: Type 3 fonts of up to 256 glyphs each, codes given in the order of first use.
+    bool outlines = false;
+    std::vector<int> outlineFonts; // by 256 codes
+    std::map<uint32_t, int> codes; // glyph -> code (256 per font)
+    std::vector<uint32_t> glyphOfCode;
 };
 
 struct Image {
@@ -241,10 +318,32 @@ struct PdfWriter::Private {
     UsedFont& used(int font)
     {
         UsedFont& u = usedFonts[slot(font)];
-        if (u.object == 0)
-            u.object = allocate();
+        if (!u.known) {
+            u.known = true;
+            u.outlines = !FontProgram::canEmbed(rawFont(font));
+            if (!u.outlines)
+                u.object = allocate();
+        }
         return u;
     }
+    int outlineCode(UsedFont& u, uint32_t glyph)
+    {
+        const auto [it, added] = u.codes.emplace(glyph, static_cast<int>(u.glyphOfCode.size()));
+        if (added) {
+            u.glyphOfCode.push_back(glyph);
+            if (it->second % 256 == 0)
+                u.outlineFonts.push_back(allocate());
+        }
+        return it->second;
+    }
+    int alphaState(int alpha)
+    {
+        auto [it, added] = alphaStates.emplace(alpha, 0);
+        if (added)
+            it->second = allocate();
+        return it->second;
+    }
+    void writeOutlineFonts(int font, UsedFont& u);
 
     void writeText(const Page& page);
     void writePicture(const Page::Picture& picture);
@@ -368,19 +467,28 @@ void PdfWriter::Private::writeText(const Page& page)
         }
         const int alpha = qAlpha(key.color);
         if (alpha != currentAlpha) {
-            auto [it, added] = alphaStates.emplace(alpha, 0);
-            if (added)
-                it->second = allocate();
+            alphaState(alpha);
             content.append("/GS");
             appendNumber(content, alpha);
             content.append(" gs\n");
             currentAlpha = alpha;
         }
-        content.append("/F");
-        appendNumber(content, slot(key.font));
-        content.append(' ');
-        appendNumber(content, size);
-        content.append(" Tf\n");
+        const int fontSlot = slot(key.font);
+        // Outline fonts change with the code's group of 256; -1 until the first glyph.
+        int outlineFont = -1;
+        const auto selectFont = [&](int group) {
+            content.append("/F");
+            appendNumber(content, fontSlot);
+            if (group >= 0) {
+                content.append('s');
+                appendNumber(content, group);
+            }
+            content.append(' ');
+            appendNumber(content, size);
+            content.append(" Tf\n");
+        };
+        if (!u.outlines)
+            selectFont(-1);
         for (const Piece& piece : pieces) {
             const ShapedText& shaped = *piece.text->text;
             // Text that shaped one glyph per character maps glyphs to characters directly.
@@ -404,10 +512,16 @@ void PdfWriter::Private::writeText(const Page& page)
                 }
                 const double x = originX + shaped.x[i];
                 const double dy = shaped.y.empty() ? 0.0 : shaped.y[i];
-                if (!open || dy != 0
+                const int code = u.outlines ? outlineCode(u, glyph) : -1;
+                const bool newFont = u.outlines && code / 256 != outlineFont;
+                if (!open || newFont || dy != 0
                     || (g > piece.first && !shaped.y.empty() && shaped.y[i - 1] != 0)) {
                     if (open)
-                        content.append("] TJ\n");
+                        content.append(">] TJ\n");
+                    if (newFont) {
+                        outlineFont = code / 256;
+                        selectFont(outlineFont);
+                    }
                     content.append("1 0 0 -1 ");
                     appendNumber(content, x);
                     content.append(' ');
@@ -417,12 +531,16 @@ void PdfWriter::Private::writeText(const Page& page)
                     pen = x;
                 } else if (std::abs(pen - x) > 0.25) {
                     // Shaping put the glyph elsewhere than the font's advance would.
+                    const double adjustment = std::round((pen - x) * 1000.0 / size);
                     content.append("> ");
-                    appendNumber(content, std::round((pen - x) * 1000.0 / size));
+                    appendNumber(content, adjustment);
                     content.append(" <");
-                    pen -= std::round((pen - x) * 1000.0 / size) * size / 1000.0;
+                    pen -= adjustment * size / 1000.0;
                 }
-                appendHex4(content, glyph);
+                if (u.outlines)
+                    appendHex2(content, static_cast<uint32_t>(code % 256));
+                else
+                    appendHex4(content, glyph);
                 pen += advance(key.font, glyph, size);
             }
             if (open)
@@ -430,11 +548,10 @@ void PdfWriter::Private::writeText(const Page& page)
         }
     }
     content.append("ET\n");
-    if (currentAlpha != 255)
+    if (currentAlpha != 255) {
+        alphaState(255);
         content.append("/GS255 gs\n");
-    if (currentAlpha != 255)
-        alphaStates.emplace(255, 0).first->second
-            = alphaStates[255] ? alphaStates[255] : allocate();
+    }
 }
 
 bool PdfWriter::addPage(const Page& page)
@@ -523,9 +640,6 @@ void PdfWriter::Private::writeFont(int font, int slot, UsedFont& u)
 {
     const FontFace face = fonts.face(font);
     const QRawFont& raw = rawFont(font);
-    const FontProgram program = FontProgram::make(raw, u.glyphs);
-    const double scale = 1000.0 / program.unitsPerEm();
-
     if (u.needsReverseMap) {
         // Glyphs shaping made from several characters (or one made of several glyphs):
         // the characters of the basic plane that the face maps to them.
@@ -543,6 +657,13 @@ void PdfWriter::Private::writeFont(int font, int slot, UsedFont& u)
         }
     }
 
+    if (u.outlines) {
+        writeOutlineFonts(font, u);
+        return;
+    }
+    const FontProgram program = FontProgram::make(raw, u.glyphs);
+    const double scale = 1000.0 / program.unitsPerEm();
+
     // A subset tag from the face's number, so two subsets of one face never share a name.
     QByteArray tag;
     for (int n = slot, i = 0; i < 6; ++i, n /= 26)
@@ -553,14 +674,10 @@ void PdfWriter::Private::writeFont(int font, int slot, UsedFont& u)
     const int descriptor = allocate();
     const int toUnicode = allocate();
     int fontFile = 0;
-    if (program.kind() != FontProgram::Kind::None) {
+    if (program.kind() == FontProgram::Kind::TrueType) {
         fontFile = allocate();
-        QByteArray dictionary = "/Filter /FlateDecode";
-        if (program.kind() == FontProgram::Kind::TrueType)
-            dictionary += " /Length1 " + QByteArray::number(program.bytes().size());
-        else
-            dictionary += " /Subtype /OpenType";
-        stream(fontFile, deflate(program.bytes(), fontLevel), dictionary);
+        stream(fontFile, deflate(program.bytes(), fontLevel),
+            "/Filter /FlateDecode /Length1 " + QByteArray::number(program.bytes().size()));
     }
 
     begin(u.object);
@@ -570,9 +687,7 @@ void PdfWriter::Private::writeFont(int font, int slot, UsedFont& u)
     end();
 
     begin(cidFont);
-    out.append(program.kind() == FontProgram::Kind::OpenType
-            ? "<< /Type /Font /Subtype /CIDFontType0 /BaseFont /"
-            : "<< /Type /Font /Subtype /CIDFontType2 /BaseFont /");
+    out.append("<< /Type /Font /Subtype /CIDFontType2 /BaseFont /");
     out.append(name);
     out.append(" /CIDSystemInfo << /Registry (Adobe) /Ordering (Identity) /Supplement 0 >> "
                "/FontDescriptor ");
@@ -590,10 +705,7 @@ void PdfWriter::Private::writeFont(int font, int slot, UsedFont& u)
         }
         out.append("] ");
     }
-    out.append("]");
-    if (program.kind() != FontProgram::Kind::OpenType)
-        out.append(" /CIDToGIDMap /Identity");
-    out.append(" >>\n");
+    out.append("] /CIDToGIDMap /Identity >>\n");
     end();
 
     begin(descriptor);
@@ -615,33 +727,71 @@ void PdfWriter::Private::writeFont(int font, int slot, UsedFont& u)
     out.append(" /StemV ");
     out.append(face.weight >= 600 ? "120" : "80");
     if (fontFile) {
-        out.append(program.kind() == FontProgram::Kind::TrueType ? " /FontFile2 " : " /FontFile3 ");
+        out.append(" /FontFile2 ");
         appendNumber(out, fontFile);
         out.append(" 0 R");
     }
     out.append(" >>\n");
     end();
 
-    QByteArray cmap = "/CIDInit /ProcSet findresource begin\n12 dict begin\nbegincmap\n"
-                      "/CIDSystemInfo << /Registry (Adobe) /Ordering (UCS) /Supplement 0 >> def\n"
-                      "/CMapName /Adobe-Identity-UCS def\n/CMapType 2 def\n"
-                      "1 begincodespacerange\n<0000> <FFFF>\nendcodespacerange\n";
-    auto entry = u.text.begin();
-    while (entry != u.text.end()) {
-        QByteArray block;
-        int n = 0;
-        for (; entry != u.text.end() && n < 100; ++entry, ++n) {
-            block.append('<');
-            appendHex4(block, entry->first);
-            block.append("> <");
-            for (const QChar c : entry->second)
-                appendHex4(block, c.unicode());
-            block.append(">\n");
-        }
-        cmap += QByteArray::number(n) + " beginbfchar\n" + block + "endbfchar\n";
-    }
-    cmap += "endcmap\nCMapName currentdict /CMap defineresource pop\nend\nend\n";
+    std::map<uint32_t, QString> byCode;
+    for (const auto& [glyph, text] : u.text)
+        byCode.emplace(glyph, text);
+    const QByteArray cmap = toUnicodeMap(byCode, 4);
     stream(toUnicode, deflate(cmap, fontLevel), "/Filter /FlateDecode");
+}
+
+void PdfWriter::Private::writeOutlineFonts(int font, UsedFont& u)
+{
+    QRawFont design = rawFont(font);
+    design.setPixelSize(1000);
+    for (size_t group = 0; group < u.outlineFonts.size(); ++group) {
+        const size_t first = group * 256;
+        const size_t count = std::min<size_t>(256, u.glyphOfCode.size() - first);
+        QByteArray differences = "[0";
+        QByteArray procs;
+        QByteArray widths;
+        std::map<uint32_t, QString> byCode;
+        for (size_t code = 0; code < count; ++code) {
+            const uint32_t glyph = u.glyphOfCode[first + code];
+            const QPainterPath path = design.pathForGlyph(glyph);
+            const double width = advance(font, glyph, 1000.0);
+            const QRectF box = path.boundingRect();
+            QByteArray proc;
+            appendNumber(proc, width);
+            proc.append(" 0 ");
+            appendNumber(proc, std::floor(box.left()));
+            proc.append(' ');
+            appendNumber(proc, std::floor(-box.bottom()));
+            proc.append(' ');
+            appendNumber(proc, std::ceil(box.right()));
+            proc.append(' ');
+            appendNumber(proc, std::ceil(-box.top()));
+            proc.append(" d1\n");
+            proc.append(outlineOperators(path));
+            const int object = allocate();
+            stream(object, deflate(proc, fontLevel), "/Filter /FlateDecode");
+            const QByteArray name = "/g" + QByteArray::number(static_cast<qulonglong>(code));
+            differences += ' ' + name;
+            procs += name + ' ' + QByteArray::number(object) + " 0 R ";
+            appendNumber(widths, width);
+            widths.append(' ');
+            if (const auto text = u.text.find(glyph); text != u.text.end())
+                byCode.emplace(static_cast<uint32_t>(code), text->second);
+        }
+        const int toUnicode = allocate();
+        stream(toUnicode, deflate(toUnicodeMap(byCode, 2), fontLevel), "/Filter /FlateDecode");
+        begin(u.outlineFonts[group]);
+        out.append("<< /Type /Font /Subtype /Type3 /FontBBox [0 0 0 0] "
+                   "/FontMatrix [0.001 0 0 0.001 0 0] /CharProcs << "
+            + procs + ">> /Encoding << /Type /Encoding /Differences " + differences
+            + "] >> /FirstChar 0 /LastChar "
+            + QByteArray::number(static_cast<qulonglong>(count - 1)) + " /Widths [" + widths
+            + "] /ToUnicode " + QByteArray::number(toUnicode) + " 0 R >>\n");
+        end();
+        if (!maybeFlush())
+            return;
+    }
 }
 
 bool PdfWriter::finish()
@@ -665,11 +815,23 @@ bool PdfWriter::finish()
     p.begin(Private::resources);
     p.out.append("<< /ProcSet [/PDF /Text /ImageB /ImageC] /Font <<");
     for (const auto& [slot, used] : p.usedFonts) {
-        p.out.append(" /F");
-        appendNumber(p.out, slot);
-        p.out.append(' ');
-        appendNumber(p.out, used.object);
-        p.out.append(" 0 R");
+        if (!used.outlines) {
+            p.out.append(" /F");
+            appendNumber(p.out, slot);
+            p.out.append(' ');
+            appendNumber(p.out, used.object);
+            p.out.append(" 0 R");
+            continue;
+        }
+        for (size_t group = 0; group < used.outlineFonts.size(); ++group) {
+            p.out.append(" /F");
+            appendNumber(p.out, slot);
+            p.out.append('s');
+            appendNumber(p.out, static_cast<double>(group));
+            p.out.append(' ');
+            appendNumber(p.out, used.outlineFonts[group]);
+            p.out.append(" 0 R");
+        }
     }
     p.out.append(" >> /XObject <<");
     for (const Image& image : std::as_const(p.images)) {

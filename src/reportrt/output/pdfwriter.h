@@ -16,7 +16,9 @@ struct Page;
 /// written as runs of glyph numbers of the faces the layout shaped with, positioned by the
 /// faces' own advance widths with a correction only where shaping placed a glyph
 /// elsewhere, and each face is embedded once at the end, cut down to the glyphs the
-/// document used, with a map back to Unicode so readers can search and copy the text.
+/// document used, with a map back to Unicode so readers can search and copy the text (a
+/// face without TrueType outlines, a Type 1 face say, is embedded as fonts of its glyphs'
+/// outlines).
 /// Identical pictures are stored once. Pages go to the device as they are written; only
 /// the fonts, the page list and the cross-reference table wait for finish().
 ///
