@@ -260,6 +260,8 @@ RecordProcessor::Result RecordProcessor::process(const RecordSet& records,
         result.count = static_cast<qsizetype>(result.order.size());
     }
 
+    // A node per group of a large report: the room growing left over is given back.
+    result.groups.shrink_to_fit();
     const qsizetype* order = result.order.empty() ? nullptr : result.order.data();
     result.totals.resize(summaries.size());
     for (GroupNode& node : result.groups)

@@ -48,7 +48,7 @@ public:
     std::vector<QString> wrap(const QString& text, int font, double width);
 
     /// Shaped texts are kept up to this many per font, then forgotten all at once.
-    static constexpr int cacheLimit = 20000;
+    static constexpr int cacheLimit = 8192;
 
 private:
     struct FontData;
