@@ -9,6 +9,7 @@
 #include "reportrt/data/recordprocessor.h"
 #include "reportrt/data/recordset.h"
 #include "reportrt/data/spillfile.h"
+#include "reportrt/exportoptions.h"
 #include "reportrt/formula/formulaexpr.h"
 #include "support/fulldisk.h"
 
@@ -126,6 +127,30 @@ INSTANTIATE_TEST_SUITE_P(Records, Spilled,
                             QJsonObject { { u"operation"_s, u"sum"_s },
                                 { u"field"_s, u"{Items.Amount}"_s } } } } } } }),
     [](const testing::TestParamInfo<SpillCase>& param) { return std::string(param.param.name); });
+
+TEST(Spilled, AFailedExportLeavesNoScratchFileBehind)
+{
+    QTemporaryDir dir;
+    const QString database = itemsDatabase(dir, 6000, 37);
+    const QString path
+        = writeReport(dir, groupedReport(QJsonObject { { u"field"_s, u"{Items.Grp}"_s } }));
+    const int scratchBefore = openScratchFiles();
+    const QStringList visibleBefore = QDir(platform::TempFolder::systemPath()).entryList();
+    {
+        const ResidentLimit limit(RecordSet::chunkRecords);
+        auto report = openReport(path, database);
+        report->readRecords();
+        ASSERT_TRUE(report->records()->isSpilled());
+        const auto options = report->exportOptions();
+        options->reset();
+        options->setFormatType(31);
+        options->setDestinationType(1);
+        options->setDiskFileName(dir.filePath(u"missing/folder/out.pdf"_s));
+        EXPECT_THROW(report->exportReport(false), core::ComError);
+        EXPECT_EQ(QDir(platform::TempFolder::systemPath()).entryList(), visibleBefore);
+    }
+    EXPECT_EQ(openScratchFiles(), scratchBefore);
+}
 
 TEST(Spilled, EveryKindOfValueComesBackAsItWasWritten)
 {
