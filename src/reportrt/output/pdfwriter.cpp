@@ -813,42 +813,27 @@ bool PdfWriter::finish()
     }
 
     p.begin(Private::resources);
-    p.out.append("<< /ProcSet [/PDF /Text /ImageB /ImageC] /Font <<");
-    for (const auto& [slot, used] : p.usedFonts) {
-        if (!used.outlines) {
-            p.out.append(" /F");
-            appendNumber(p.out, slot);
-            p.out.append(' ');
-            appendNumber(p.out, used.object);
-            p.out.append(" 0 R");
-            continue;
-        }
-        for (size_t group = 0; group < used.outlineFonts.size(); ++group) {
-            p.out.append(" /F");
-            appendNumber(p.out, slot);
-            p.out.append('s');
-            appendNumber(p.out, static_cast<double>(group));
-            p.out.append(' ');
-            appendNumber(p.out, used.outlineFonts[group]);
-            p.out.append(" 0 R");
-        }
-    }
-    p.out.append(" >> /XObject <<");
-    for (const Image& image : std::as_const(p.images)) {
-        p.out.append(" /Im");
-        appendNumber(p.out, image.index);
-        p.out.append(' ');
-        appendNumber(p.out, image.object);
-        p.out.append(" 0 R");
-    }
-    p.out.append(" >> /ExtGState <<");
-    for (const auto& [alpha, object] : p.alphaStates) {
-        p.out.append(" /GS");
-        appendNumber(p.out, alpha);
-        p.out.append(' ');
+    // " /Name n 0 R": one entry of a resource dictionary.
+    const auto entry = [&p](const QByteArray& name, int object) {
+        p.out.append(" /" + name + ' ');
         appendNumber(p.out, object);
         p.out.append(" 0 R");
+    };
+    p.out.append("<< /ProcSet [/PDF /Text /ImageB /ImageC] /Font <<");
+    for (const auto& [slot, used] : p.usedFonts) {
+        const QByteArray name = 'F' + QByteArray::number(slot);
+        if (!used.outlines)
+            entry(name, used.object);
+        for (size_t group = 0; used.outlines && group < used.outlineFonts.size(); ++group)
+            entry(name + 's' + QByteArray::number(static_cast<qulonglong>(group)),
+                used.outlineFonts[group]);
     }
+    p.out.append(" >> /XObject <<");
+    for (const Image& image : std::as_const(p.images))
+        entry("Im" + QByteArray::number(image.index), image.object);
+    p.out.append(" >> /ExtGState <<");
+    for (const auto& [alpha, object] : p.alphaStates)
+        entry("GS" + QByteArray::number(alpha), object);
     p.out.append(" >> >>\n");
     p.end();
 
