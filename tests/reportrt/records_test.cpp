@@ -1,5 +1,6 @@
 #include "core/comerror.h"
 #include "reportrt/application.h"
+#include "reportrt/base/invarianttext.h"
 #include "reportrt/base/runtimeerror.h"
 #include "reportrt/data/providermap.h"
 #include "reportrt/report.h"
@@ -607,3 +608,26 @@ TEST(Application, LogOnToAFileDatabaseAndToAnUnreachableServer)
 }
 
 } // namespace
+
+TEST(InvariantText, DatesAsDatabasesWriteThem)
+{
+    struct Case {
+        const char16_t* text;
+        std::optional<QDate> date;
+    };
+    const Case cases[] = {
+        { u"2026-12-06", QDate(2026, 12, 6) }, { u"0001-01-01", QDate(1, 1, 1) },
+        { u"2024-02-29", QDate(2024, 2, 29) }, { u"2026-02-29", std::nullopt }, // no such day
+        { u"2026-13-01", std::nullopt }, { u"2026-1-01", std::nullopt },
+        { u"2026/12/06", std::nullopt }, { u"2026-12-06 ", std::nullopt },
+        { u"20261-2-06", std::nullopt },
+        { u"\u0662\u0660\u0662\u0666-\u0660\u0661-\u0660\u0661", std::nullopt }, // other digits
+    };
+    for (const Case& c : cases) {
+        const auto day = invarianttext::parseDate(QString::fromUtf16(c.text));
+        if (c.date)
+            EXPECT_EQ(day, c.date->toJulianDay()) << QString::fromUtf16(c.text).toStdString();
+        else
+            EXPECT_FALSE(day) << QString::fromUtf16(c.text).toStdString();
+    }
+}

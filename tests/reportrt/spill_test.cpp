@@ -16,6 +16,7 @@
 #include <QDir>
 #include <QJsonArray>
 #include <gtest/gtest.h>
+#include <limits>
 
 using namespace Qt::StringLiterals;
 
@@ -236,6 +237,67 @@ TEST(Spilled, RecordsInAndOutOfPrintOrderGroupAlike)
         EXPECT_EQ(streamed.groups[g].recordCount, expected.groups[g].recordCount);
         EXPECT_EQ(streamed.groups[g].summaries, expected.groups[g].summaries);
     }
+}
+
+std::shared_ptr<FormulaExpr> column(int index, ValueType type)
+{
+    auto e = std::make_shared<FormulaExpr>();
+    e->kind = FormulaExpr::Kind::Field;
+    e->column = index;
+    e->type = type;
+    return e;
+}
+
+TEST(Summaries, EveryLevelInOneWalkMatchesEachGroupSummarizedAlone)
+{
+    // Two group levels, every operation, Null values, spilled records.
+    const ResidentLimit limit(1);
+    RecordSet records(3);
+    for (int r = 0; r < 9000; ++r) {
+        Value* record = records.append();
+        record[0] = Value::number(r / 3000);
+        record[1] = Value::number((r / 300) % 10);
+        record[2] = r % 7 == 0 ? Value() : Value::number((r * 37) % 1001 - 500);
+    }
+    const auto amount = column(2, ValueType::Number);
+    const std::vector<RecordProcessor::Group> groups { { column(0, ValueType::Number) },
+        { column(1, ValueType::Number) } };
+    std::vector<RecordProcessor::Summary> summaries;
+    for (const auto operation : { SummaryOperation::Sum, SummaryOperation::Average,
+             SummaryOperation::Count, SummaryOperation::Minimum, SummaryOperation::Maximum }) {
+        for (int level = 0; level <= 2; ++level)
+            summaries.push_back({ operation, amount, level });
+    }
+    const auto result = RecordProcessor::process(records, groups, {}, summaries);
+    ASSERT_EQ(result.groups.size(), 3u + 30u);
+    for (size_t s = 0; s < summaries.size(); ++s) {
+        const auto& summary = summaries[s];
+        if (summary.level == 0) {
+            EXPECT_EQ(result.totals[s],
+                RecordProcessor::summarize(
+                    summary.operation, *amount, records, nullptr, 0, result.size()));
+            continue;
+        }
+        for (const auto& node : result.groups) {
+            if (node.level != summary.level)
+                continue;
+            EXPECT_EQ(node.summaries[s],
+                RecordProcessor::summarize(summary.operation, *amount, records, nullptr,
+                    node.firstRecord, node.recordCount))
+                << s << " at " << node.firstRecord;
+        }
+    }
+
+    // A currency sum that overflows fails as the formula it came from.
+    RecordSet money(2);
+    for (int r = 0; r < 4; ++r) {
+        Value* record = money.append();
+        record[0] = Value::number(0);
+        record[1] = Value::currency(std::numeric_limits<int64_t>::max() / 3);
+    }
+    EXPECT_THROW(RecordProcessor::process(money, { { column(0, ValueType::Number) } }, {},
+                     { { SummaryOperation::Sum, column(1, ValueType::Currency), 1 } }),
+        FormulaException);
 }
 
 TEST(Spilled, AFullDiskFailsTheReadWithTheReasonAndLeavesNothing)

@@ -144,6 +144,23 @@ std::optional<int32_t> msecs(int hour, int minute, const QString& seconds, const
 
 std::optional<int64_t> parseDate(const QString& text)
 {
+    // Databases hand over dates as plain ASCII "YYYY-MM-DD", one per record: read those
+    // directly; anything else (other digits, other shapes) goes through the pattern.
+    if (text.size() == 10 && text[4] == u'-' && text[7] == u'-') {
+        int value[3] = { 0, 0, 0 };
+        bool ascii = true;
+        for (qsizetype i = 0, part = 0; i < 10 && ascii; ++i) {
+            const char16_t ch = text[i].unicode();
+            if (i == 4 || i == 7) {
+                ++part;
+                continue;
+            }
+            ascii = ch >= u'0' && ch <= u'9';
+            value[part] = value[part] * 10 + (ch - u'0');
+        }
+        if (ascii)
+            return julianDay(value[0], value[1], value[2]);
+    }
     static const QRegularExpression pattern(QStringLiteral("^(\\d{4})-(\\d{2})-(\\d{2})$"));
     const auto match = pattern.match(text);
     if (!match.hasMatch())

@@ -169,61 +169,141 @@ bool groupInReadOrder(const RecordSet& records, const std::vector<RecordProcesso
 }
 } // namespace
 
-Value RecordProcessor::summarize(SummaryOperation operation, const FormulaExpr& field,
-    const RecordSet& records, const qsizetype* indexes, qsizetype first, qsizetype count)
-{
-    const bool currency = field.type == ValueType::Currency;
-    double sum = 0;
-    int64_t currencySum = 0;
-    bool overflow = false;
-    qsizetype values = 0;
-    Value best;
-    for (qsizetype i = 0; i < count; ++i) {
-        const Value v = fieldValue(field, records.record(indexes ? indexes[i] : first + i));
+namespace {
+// One summary over values given one at a time: Null values are skipped, a sum of none is 0,
+// a count counts values, an average, minimum or maximum of none is Null.
+class Accumulator {
+public:
+    Accumulator(SummaryOperation operation, const FormulaExpr& field)
+        : m_operation(operation)
+        , m_field(&field)
+        , m_currency(field.type == ValueType::Currency)
+    { }
+
+    void add(const Value& v)
+    {
         if (v.isNull())
-            continue;
-        ++values;
-        switch (operation) {
+            return;
+        ++m_values;
+        switch (m_operation) {
         case SummaryOperation::Sum:
         case SummaryOperation::Average:
-            if (currency)
-                overflow = overflow
-                    || __builtin_add_overflow(currencySum, v.currencyScaled(), &currencySum);
+            if (m_currency)
+                m_overflow = m_overflow
+                    || __builtin_add_overflow(m_currencySum, v.currencyScaled(), &m_currencySum);
             else
-                sum += v.numeric();
+                m_sum += v.numeric();
             break;
         case SummaryOperation::Minimum:
-            if (best.isNull() || FormulaEvaluator::compare(v, best) < 0)
-                best = v;
+            if (m_best.isNull() || FormulaEvaluator::compare(v, m_best) < 0)
+                m_best = v;
             break;
         case SummaryOperation::Maximum:
-            if (best.isNull() || FormulaEvaluator::compare(v, best) > 0)
-                best = v;
+            if (m_best.isNull() || FormulaEvaluator::compare(v, m_best) > 0)
+                m_best = v;
             break;
         case SummaryOperation::Count:
             break;
         }
     }
-    if (overflow)
-        throw FormulaException(
-            { QString(), field.position, QStringLiteral("the currency sum overflows") });
-    switch (operation) {
-    case SummaryOperation::Sum:
-        return currency ? Value::currency(currencySum) : Value::number(sum);
-    case SummaryOperation::Average:
-        if (values == 0)
-            return {};
-        if (currency)
-            return Value::currency(*invarianttext::currencyFromDouble(
-                static_cast<double>(currencySum) / 10000.0 / static_cast<double>(values)));
-        return Value::number(sum / static_cast<double>(values));
-    case SummaryOperation::Count:
-        return Value::number(static_cast<double>(values));
-    case SummaryOperation::Minimum:
-    case SummaryOperation::Maximum:
-        return best;
+
+    /// Raises FormulaException when a currency sum overflowed.
+    Value result() const
+    {
+        if (m_overflow)
+            throw FormulaException(
+                { QString(), m_field->position, QStringLiteral("the currency sum overflows") });
+        switch (m_operation) {
+        case SummaryOperation::Sum:
+            return m_currency ? Value::currency(m_currencySum) : Value::number(m_sum);
+        case SummaryOperation::Average:
+            if (m_values == 0)
+                return {};
+            if (m_currency)
+                return Value::currency(*invarianttext::currencyFromDouble(
+                    static_cast<double>(m_currencySum) / 10000.0 / static_cast<double>(m_values)));
+            return Value::number(m_sum / static_cast<double>(m_values));
+        case SummaryOperation::Count:
+            return Value::number(static_cast<double>(m_values));
+        case SummaryOperation::Minimum:
+        case SummaryOperation::Maximum:
+            return m_best;
+        }
+        return {};
     }
-    return {};
+
+private:
+    SummaryOperation m_operation;
+    const FormulaExpr* m_field;
+    bool m_currency;
+    double m_sum = 0;
+    int64_t m_currencySum = 0;
+    bool m_overflow = false;
+    qsizetype m_values = 0;
+    Value m_best;
+};
+
+// Every summary of every group and of the report in one walk over the printed records: each
+// pass over spilled records decodes them again.
+void summarizeAll(const RecordSet& records, const std::vector<RecordProcessor::Summary>& summaries,
+    size_t levels, RecordProcessor::Result& result)
+{
+    if (summaries.empty())
+        return;
+    std::vector<std::vector<int>> nodesOfLevel(levels);
+    for (size_t i = 0; i < result.groups.size(); ++i) {
+        const auto level = static_cast<size_t>(result.groups[i].level);
+        if (level >= 1 && level <= levels)
+            nodesOfLevel[level - 1].push_back(static_cast<int>(i));
+    }
+    std::vector<size_t> cursor(levels, 0);
+    std::vector<Accumulator> running;
+    for (const RecordProcessor::Summary& s : summaries)
+        running.emplace_back(s.operation, *s.field);
+    const auto finishNode = [&](size_t level) {
+        RecordProcessor::GroupNode& node
+            = result.groups[static_cast<size_t>(nodesOfLevel[level][cursor[level]])];
+        for (size_t s = 0; s < summaries.size(); ++s) {
+            if (static_cast<size_t>(summaries[s].level) != level + 1)
+                continue;
+            node.summaries[s] = running[s].result();
+            running[s] = Accumulator(summaries[s].operation, *summaries[s].field);
+        }
+        ++cursor[level];
+    };
+    for (qsizetype p = 0; p < result.size(); ++p) {
+        for (size_t l = 0; l < levels; ++l) {
+            while (cursor[l] < nodesOfLevel[l].size()) {
+                const auto& node = result.groups[static_cast<size_t>(nodesOfLevel[l][cursor[l]])];
+                if (p < node.firstRecord + node.recordCount)
+                    break;
+                finishNode(l);
+            }
+        }
+        const Value* record = records.record(result.recordAt(p));
+        for (size_t s = 0; s < summaries.size(); ++s) {
+            if (static_cast<size_t>(summaries[s].level) <= levels)
+                running[s].add(fieldValue(*summaries[s].field, record));
+        }
+    }
+    for (size_t l = 0; l < levels; ++l) {
+        while (cursor[l] < nodesOfLevel[l].size())
+            finishNode(l);
+    }
+    for (size_t s = 0; s < summaries.size(); ++s) {
+        if (summaries[s].level == 0)
+            result.totals[s] = running[s].result();
+    }
+}
+} // namespace
+
+Value RecordProcessor::summarize(SummaryOperation operation, const FormulaExpr& field,
+    const RecordSet& records, const qsizetype* indexes, qsizetype first, qsizetype count)
+{
+    Accumulator accumulator(operation, field);
+    for (qsizetype i = 0; i < count; ++i)
+        accumulator.add(fieldValue(field, records.record(indexes ? indexes[i] : first + i)));
+    return accumulator.result();
 }
 
 RecordProcessor::Result RecordProcessor::process(const RecordSet& records,
@@ -262,23 +342,10 @@ RecordProcessor::Result RecordProcessor::process(const RecordSet& records,
 
     // A node per group of a large report: the room growing left over is given back.
     result.groups.shrink_to_fit();
-    const qsizetype* order = result.order.empty() ? nullptr : result.order.data();
     result.totals.resize(summaries.size());
     for (GroupNode& node : result.groups)
         node.summaries.resize(summaries.size());
-    for (size_t s = 0; s < summaries.size(); ++s) {
-        const Summary& summary = summaries[s];
-        if (summary.level == 0) {
-            result.totals[s]
-                = summarize(summary.operation, *summary.field, records, order, 0, result.count);
-            continue;
-        }
-        for (GroupNode& node : result.groups) {
-            if (node.level == summary.level)
-                node.summaries[s] = summarize(summary.operation, *summary.field, records,
-                    order ? order + node.firstRecord : nullptr, node.firstRecord, node.recordCount);
-        }
-    }
+    summarizeAll(records, summaries, groups.size(), result);
     return result;
 }
 
