@@ -12,6 +12,7 @@
 #include <algorithm>
 #include <charconv>
 #include <cmath>
+#include <initializer_list>
 #include <map>
 #include <vector>
 
@@ -39,6 +40,15 @@ void appendNumber(QByteArray& out, double value)
             --result.ptr;
     }
     out.append(buffer, result.ptr - buffer);
+}
+
+// Numbers separated by spaces, and one after the last: "x y w h ".
+void appendNumbers(QByteArray& out, std::initializer_list<double> values)
+{
+    for (const double value : values) {
+        appendNumber(out, value);
+        out.append(' ');
+    }
 }
 
 void appendHex4(QByteArray& out, uint32_t value)
@@ -377,14 +387,9 @@ void PdfWriter::Private::writePicture(const Page::Picture& picture)
     const Image image = images.value(picture.image.cacheKey());
     const int index = image.object ? image.index : imageObject(picture.image);
     content.append("q\n");
-    appendNumber(content, picture.clip.x());
-    content.append(' ');
-    appendNumber(content, picture.clip.y());
-    content.append(' ');
-    appendNumber(content, picture.clip.width());
-    content.append(' ');
-    appendNumber(content, picture.clip.height());
-    content.append(" re W n\n");
+    appendNumbers(content,
+        { picture.clip.x(), picture.clip.y(), picture.clip.width(), picture.clip.height() });
+    content.append("re W n\n");
     appendNumber(content, picture.target.width());
     content.append(" 0 0 ");
     appendNumber(content, -picture.target.height());
@@ -566,14 +571,9 @@ bool PdfWriter::addPage(const Page& page)
         if (!box.filled)
             continue;
         appendColor(p.content, box.fill, "rg");
-        appendNumber(p.content, box.rect.x());
-        p.content.append(' ');
-        appendNumber(p.content, box.rect.y());
-        p.content.append(' ');
-        appendNumber(p.content, box.rect.width());
-        p.content.append(' ');
-        appendNumber(p.content, box.rect.height());
-        p.content.append(" re f\n");
+        appendNumbers(
+            p.content, { box.rect.x(), box.rect.y(), box.rect.width(), box.rect.height() });
+        p.content.append("re f\n");
     }
     for (const Page::Picture& picture : page.pictures)
         p.writePicture(picture);
@@ -586,27 +586,17 @@ bool PdfWriter::addPage(const Page& page)
         // The frame lies inside the box, as the designer drew it.
         const QRectF r = box.rect.adjusted(
             box.lineWidth / 2, box.lineWidth / 2, -box.lineWidth / 2, -box.lineWidth / 2);
-        appendNumber(p.content, r.x());
-        p.content.append(' ');
-        appendNumber(p.content, r.y());
-        p.content.append(' ');
-        appendNumber(p.content, r.width());
-        p.content.append(' ');
-        appendNumber(p.content, r.height());
-        p.content.append(" re S\n");
+        appendNumbers(p.content, { r.x(), r.y(), r.width(), r.height() });
+        p.content.append("re S\n");
     }
     const auto line = [&p](QPointF from, QPointF to, double width, QRgb color) {
         appendColor(p.content, color, "RG");
-        appendNumber(p.content, width);
-        p.content.append(" w ");
-        appendNumber(p.content, from.x());
-        p.content.append(' ');
-        appendNumber(p.content, from.y());
-        p.content.append(" m ");
-        appendNumber(p.content, to.x());
-        p.content.append(' ');
-        appendNumber(p.content, to.y());
-        p.content.append(" l S\n");
+        appendNumbers(p.content, { width });
+        p.content.append("w ");
+        appendNumbers(p.content, { from.x(), from.y() });
+        p.content.append("m ");
+        appendNumbers(p.content, { to.x(), to.y() });
+        p.content.append("l S\n");
     };
     for (const Page::Line& l : page.lines)
         line(l.from, l.to, l.width, l.color);
