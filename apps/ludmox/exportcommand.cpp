@@ -29,11 +29,6 @@ struct Format {
 const Format formats[]
     = { { u"pdf"_s, u".pdf"_s }, { u"xlsx"_s, u".xlsx"_s }, { u"html"_s, u".html"_s } };
 
-void printError(const QString& text)
-{
-    std::fputs(qPrintable(u"ludmox: "_s + text + u'\n'), stderr);
-}
-
 /// Writes `target` through the report object in one pass. Its usual route lays the report
 /// out twice (a scratch file to learn whether there are records, then the target); the user
 /// wants the file either way, so the report writes its "scratch" file straight to a hidden
@@ -103,23 +98,19 @@ int exportCommand(const QStringList& arguments)
         u"sample reports)."_s,
         u"folder"_s, sampleReports() });
     ReportHost::addReportOptions(parser);
-    if (!parser.parse(arguments)) {
-        printError(parser.errorText());
+    if (!ReportHost::parseArguments(parser, arguments))
         return 2;
-    }
-    if (parser.isSet(u"help"_s))
-        parser.showHelp(0);
 
     const QString format = parser.value(u"format"_s).toLower();
     const auto known = std::find_if(std::begin(formats), std::end(formats),
         [&](const Format& candidate) { return candidate.name == format; });
     if (known == std::end(formats)) {
-        printError(u"unknown format %1; use pdf, xlsx or html"_s.arg(format));
+        ReportHost::printError(u"unknown format %1; use pdf, xlsx or html"_s.arg(format));
         return 2;
     }
     const QString output = parser.value(u"output"_s);
     if (output.isEmpty() || !QDir().mkpath(output)) {
-        printError(u"cannot create the output folder %1"_s.arg(output));
+        ReportHost::printError(u"cannot create the output folder %1"_s.arg(output));
         return 2;
     }
     int failures = 0;
@@ -132,7 +123,7 @@ int exportCommand(const QStringList& arguments)
                 paths << folder.filePath(name);
         }
         if (paths.isEmpty()) {
-            printError(u"no reports to export"_s);
+            ReportHost::printError(u"no reports to export"_s);
             return 2;
         }
         for (qsizetype i = 0; i < paths.size(); ++i) {
@@ -164,12 +155,12 @@ int exportCommand(const QStringList& arguments)
                 report->CloseReport();
             } catch (const core::ComError& error) {
                 ReportHost::progress(QString());
-                printError(u"%1: %2"_s.arg(path, host.explain(error)));
+                ReportHost::printError(u"%1: %2"_s.arg(path, host.explain(error)));
                 ++failures;
             }
         }
     } catch (const core::ComError& error) {
-        printError(error.description());
+        ReportHost::printError(error.description());
         return 2;
     }
     return failures == 0 ? 0 : 1;

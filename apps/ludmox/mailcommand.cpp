@@ -10,14 +10,7 @@
 
 using namespace Qt::StringLiterals;
 
-namespace {
-
-void printError(const QString& text)
-{
-    std::fputs(qPrintable(u"ludmox: "_s + text + u'\n'), stderr);
-}
-
-} // namespace
+namespace { } // namespace
 
 int mailCommand(const QStringList& arguments)
 {
@@ -38,21 +31,17 @@ int mailCommand(const QStringList& arguments)
     parser.addOption(
         { u"attachment"_s, u"The attachment's base name (a file name)."_s, u"name"_s });
     ReportHost::addReportOptions(parser);
-    if (!parser.parse(arguments)) {
-        printError(parser.errorText());
+    if (!ReportHost::parseArguments(parser, arguments))
         return 2;
-    }
-    if (parser.isSet(u"help"_s))
-        parser.showHelp(0);
 
     const QStringList reportPaths = parser.positionalArguments().mid(1);
     if (reportPaths.size() != 1) {
-        printError(u"name one report to mail"_s);
+        ReportHost::printError(u"name one report to mail"_s);
         return 2;
     }
     QString address = parser.value(u"to"_s);
     if (address.trimmed().isEmpty()) {
-        printError(u"give the recipients with --to ADDRESS"_s);
+        ReportHost::printError(u"give the recipients with --to ADDRESS"_s);
         return 2;
     }
     const QString format = parser.value(u"format"_s).toLower();
@@ -64,7 +53,7 @@ int mailCommand(const QStringList& arguments)
     else if (format == u"html")
         attachmentType = 32;
     else {
-        printError(u"unknown format %1; use pdf, xlsx or html"_s.arg(format));
+        ReportHost::printError(u"unknown format %1; use pdf, xlsx or html"_s.arg(format));
         return 2;
     }
 
@@ -90,21 +79,21 @@ int mailCommand(const QStringList& arguments)
                 return 0;
             }
             if (!report->SendMailError()) {
-                printError(u"%1: the report has no records; nothing was mailed"_s.arg(
+                ReportHost::printError(u"%1: the report has no records; nothing was mailed"_s.arg(
                     reportPaths.front()));
                 return 1;
             }
             const QString cause = host.failureText();
-            printError(
+            ReportHost::printError(
                 cause.isEmpty() ? u"%1: the mail was not sent"_s.arg(reportPaths.front()) : cause);
             return 1;
         } catch (const core::ComError& error) {
             ReportHost::progress(QString());
-            printError(u"%1: %2"_s.arg(reportPaths.front(), host.explain(error)));
+            ReportHost::printError(u"%1: %2"_s.arg(reportPaths.front(), host.explain(error)));
             return 1;
         }
     } catch (const core::ComError& error) {
-        printError(error.description());
+        ReportHost::printError(error.description());
         return 2;
     }
 }

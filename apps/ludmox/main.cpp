@@ -7,21 +7,13 @@
 #include "mailcommand.h"
 #include "previewcommand.h"
 #include "printcommand.h"
+#include "reporthost.h"
 #include "reportrt/viewer/registerruntime.h"
 
 #include <QApplication>
 #include <QCommandLineParser>
 #include <cstdio>
 #include <malloc.h>
-
-namespace {
-
-void printError(const QString& text)
-{
-    std::fputs(qPrintable(u"ludmox: " + text + u'\n'), stderr);
-}
-
-} // namespace
 
 int main(int argc, char* argv[])
 {
@@ -85,7 +77,8 @@ int main(int argc, char* argv[])
         return ludmox::printReport(parser);
     if (command == u"printers")
         return ludmox::listPrinters();
-    printError(command.isEmpty() ? QStringLiteral("no command; try --help")
-                                 : QStringLiteral("unknown command %1; try --help").arg(command));
+    ReportHost::printError(command.isEmpty()
+            ? QStringLiteral("no command; try --help")
+            : QStringLiteral("unknown command %1; try --help").arg(command));
     return 2;
 }

@@ -19,11 +19,6 @@ using namespace Qt::StringLiterals;
 
 namespace {
 
-void printError(const QString& text)
-{
-    std::fputs(qPrintable(u"ludmox: " + text + u'\n'), stderr);
-}
-
 /// Ends a wait once the watched window is hidden: closing the preview only hides it.
 class HideWatcher : public QObject {
 public:
@@ -60,19 +55,16 @@ int previewCommand(const QStringList& arguments)
     parser.addPositionalArgument(u"preview"_s, u"The command."_s);
     parser.addPositionalArgument(u"report"_s, u"The report file to show."_s, u"REPORT"_s);
     ReportHost::addReportOptions(parser);
-    if (!parser.parse(arguments)) {
-        printError(parser.errorText());
+    if (!ReportHost::parseArguments(parser, arguments))
         return 2;
-    }
-    if (parser.isSet(u"help"_s))
-        parser.showHelp(0);
     const QStringList paths = parser.positionalArguments().mid(1);
     if (paths.size() != 1) {
-        printError(u"preview takes one report; try preview --help"_s);
+        ReportHost::printError(u"preview takes one report; try preview --help"_s);
         return 2;
     }
     if (!hasDisplay()) {
-        printError(u"preview needs a display (DISPLAY or WAYLAND_DISPLAY); use export instead"_s);
+        ReportHost::printError(
+            u"preview needs a display (DISPLAY or WAYLAND_DISPLAY); use export instead"_s);
         return 2;
     }
     const QString path = paths.first();
@@ -82,7 +74,8 @@ int previewCommand(const QStringList& arguments)
         host = std::make_unique<ReportHost>(Logon::fromOptions(parser));
         report = host->open(path, parser);
     } catch (const core::ComError& error) {
-        printError(host ? u"%1: %2"_s.arg(path, host->explain(error)) : error.description());
+        ReportHost::printError(
+            host ? u"%1: %2"_s.arg(path, host->explain(error)) : error.description());
         return host ? 1 : 2;
     }
 
@@ -103,12 +96,12 @@ int previewCommand(const QStringList& arguments)
         int16_t copies = 1;
         window->ShowReport(copies, owner);
     } catch (const core::ComError& error) {
-        printError(u"%1: %2"_s.arg(path, error.description()));
+        ReportHost::printError(u"%1: %2"_s.arg(path, error.description()));
         window->Destroy();
         return 1;
     }
     if (!failure.isEmpty()) {
-        printError(u"%1: %2"_s.arg(path, failure));
+        ReportHost::printError(u"%1: %2"_s.arg(path, failure));
         window->Destroy();
         return 1;
     }

@@ -47,6 +47,22 @@ void keepReportWarnings(QtMsgType type, const QMessageLogContext& context, const
 
 } // namespace
 
+bool ReportHost::parseArguments(QCommandLineParser& parser, const QStringList& arguments)
+{
+    if (!parser.parse(arguments)) {
+        printError(parser.errorText());
+        return false;
+    }
+    if (parser.isSet(QStringLiteral("help")))
+        parser.showHelp(0);
+    return true;
+}
+
+void ReportHost::printError(const QString& text)
+{
+    std::fputs(qPrintable(QStringLiteral("ludmox: ") + text + u'\n'), stderr);
+}
+
 void ReportHost::addReportOptions(QCommandLineParser& parser)
 {
     Logon::addOptions(parser);

@@ -28,6 +28,11 @@ class ReportHost {
 public:
     /// --logon, --database, --param and --selection, which every report command takes.
     static void addReportOptions(QCommandLineParser& parser);
+    /// Parses a command's arguments; --help prints the help and ends the program. False,
+    /// after saying why on standard error, when they do not parse.
+    static bool parseArguments(QCommandLineParser& parser, const QStringList& arguments);
+    /// "ludmox: text" on standard error.
+    static void printError(const QString& text);
 
     explicit ReportHost(const Logon& logon);
     ~ReportHost();
