@@ -13,6 +13,7 @@
 #include <QSqlDatabase>
 #include <QSqlError>
 #include <QSqlQuery>
+#include <cstdio>
 #include <gtest/gtest.h>
 #include <map>
 #include <optional>
@@ -131,6 +132,21 @@ protected:
     }
 
     /// Relocates the way the engine does for a SQL Server logon.
+    /// Whether ODBC reaches the server; where it must (LUDMOX_REQUIRE_ODBC), not reaching it
+    /// fails the test.
+    bool odbcUsable() const
+    {
+        const QString problem = odbcProblem(m_server.odbcDriver);
+        if (problem.isEmpty())
+            return true;
+        if (qEnvironmentVariableIsSet("LUDMOX_REQUIRE_ODBC"))
+            ADD_FAILURE() << "ODBC is required (LUDMOX_REQUIRE_ODBC) but not usable: "
+                          << problem.toStdString();
+        else
+            std::fprintf(stderr, "ODBC is not usable: %s\n", qPrintable(problem));
+        return false;
+    }
+
     std::shared_ptr<Report> open(const QString& formula, QJsonObject d = shopReport())
     {
         d[u"selectionFormula"] = formula;
@@ -275,13 +291,8 @@ std::map<int, QStringList> everyValue(Report& report)
 
 TEST_F(PostgreSql, RecordsThroughOdbcEqualThoseThroughQpsql)
 {
-    const QString problem = odbcProblem(m_server.odbcDriver);
-    if (!problem.isEmpty()) {
-        if (qEnvironmentVariableIsSet("LUDMOX_REQUIRE_ODBC"))
-            FAIL() << "ODBC is required (LUDMOX_REQUIRE_ODBC) but not usable: "
-                   << problem.toStdString();
-        GTEST_SKIP() << "ODBC is not usable: " << problem.toStdString();
-    }
+    if (!odbcUsable())
+        GTEST_SKIP() << "ODBC is not usable";
     const auto read = [&](const QString& driver) {
         ProviderMap::setServerDriver(driver);
         ProviderMap::setOdbcDriver(m_server.odbcDriver);
@@ -314,13 +325,8 @@ TEST_F(PostgreSql, RecordsThroughOdbcEqualThoseThroughQpsql)
 // scripts/start-services.sh makes the role ludmox_quote with this password.
 TEST_F(PostgreSql, OdbcLogonWithHostilePassword)
 {
-    const QString problem = odbcProblem(m_server.odbcDriver);
-    if (!problem.isEmpty()) {
-        if (qEnvironmentVariableIsSet("LUDMOX_REQUIRE_ODBC"))
-            FAIL() << "ODBC is required (LUDMOX_REQUIRE_ODBC) but not usable: "
-                   << problem.toStdString();
-        GTEST_SKIP() << "ODBC is not usable: " << problem.toStdString();
-    }
+    if (!odbcUsable())
+        GTEST_SKIP() << "ODBC is not usable";
     Server quote = m_server;
     quote.user = u"ludmox_quote"_s;
     quote.password = u"p;w}d{x=y}} ;UID=postgres;"_s;
